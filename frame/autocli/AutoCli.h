@@ -19,7 +19,7 @@ enum class NodeType { Namespace, Command };
 // A node of the command tree. Children are kept in registration order and known by the name
 // under which they were registered.
 class KALMOR_API NamespaceNode : public std::enable_shared_from_this<NamespaceNode> {
-public:
+  public:
     virtual ~NamespaceNode();
 
     // A shared pointer to this node; valid once the node is owned by a shared pointer.
@@ -35,7 +35,8 @@ public:
     virtual std::shared_ptr<NamespaceNode> GetNamespaceNode(const std::string& name) const;
     // Adds a child under that name and makes this node its parent. Throws
     // std::invalid_argument for a null node, an empty name or a name already taken.
-    virtual void RegisterNamespaceNode(std::shared_ptr<NamespaceNode> node, const std::string& name);
+    virtual void RegisterNamespaceNode(std::shared_ptr<NamespaceNode> node,
+                                       const std::string& name);
     // Follows the names down from this node; nullptr when a name is not found.
     virtual std::shared_ptr<NamespaceNode> ResolveNode(const std::vector<std::string>& names) const;
     // The child namespace of that name, made and registered when missing.
@@ -50,10 +51,10 @@ public:
     // The name under which the parent registered this node (empty for the root).
     const std::string& GetName() const { return name_; }
 
-protected:
+  protected:
     NamespaceNode();
 
-private:
+  private:
     std::string description_;
     std::string name_;
     std::weak_ptr<NamespaceNode> parent_;
@@ -62,19 +63,19 @@ private:
 
 // A node that only holds children.
 class KALMOR_API Namespace : public NamespaceNode {
-public:
+  public:
     static std::shared_ptr<Namespace> New();
     ~Namespace() override;
     NodeType GetType() const override;
 
-protected:
+  protected:
     Namespace();
 };
 
 // A leaf of the tree that describes a command: its metadata, default output formatter and
 // default output parameters, and its input and output specifications.
 class KALMOR_API CommandSpec : public CallSpec::CallTargetSpec, public NamespaceNode {
-public:
+  public:
     ~CommandSpec() override;
 
     std::shared_ptr<CallSpec::InputSpec> GetInputSpec() override;
@@ -108,10 +109,10 @@ public:
         return outputParameters_;
     }
 
-protected:
+  protected:
     CommandSpec();
 
-private:
+  private:
     std::vector<std::pair<std::string, std::string>> metadata_;
     std::string formatter_;
     std::vector<std::pair<std::string, std::string>> outputParameters_;
@@ -119,7 +120,7 @@ private:
 
 // The base of every command class.
 class KALMOR_API Command : public CommandSpec, public CallSpec::CallTarget {
-public:
+  public:
     ~Command() override;
 
     // Runs the command: hands the input and output to ExecuteInternal.
@@ -128,7 +129,7 @@ public:
     virtual void ExecuteInternal(std::shared_ptr<CallSpec::Input> input,
                                  std::shared_ptr<CallSpec::Output> output) = 0;
 
-protected:
+  protected:
     Command();
 };
 

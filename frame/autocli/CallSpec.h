@@ -31,7 +31,7 @@ enum ParameterConstraintType {
 };
 
 class KALMOR_API ParameterConstraint {
-public:
+  public:
     struct EnumValue {
         std::string value;
         std::string description;
@@ -48,7 +48,7 @@ public:
     int64_t GetIntMinimum() const { return minimum_; }
     int64_t GetIntMaximum() const { return maximum_; }
 
-private:
+  private:
     ParameterConstraintType type_ = CONSTRAINT_NONE;
     std::vector<EnumValue> enumValues_;
     int64_t minimum_ = 0;
@@ -56,7 +56,7 @@ private:
 };
 
 class KALMOR_API ParameterSpec {
-public:
+  public:
     static std::shared_ptr<ParameterSpec> New(const std::string& name, ParameterType type);
     virtual ~ParameterSpec();
 
@@ -73,7 +73,7 @@ public:
     // The constraint, or nullptr when the parameter has none.
     const std::shared_ptr<ParameterConstraint>& GetConstraint() const { return constraint_; }
 
-private:
+  private:
     std::string name_;
     ParameterType type_ = PARAM_STRING;
     std::string shortName_;
@@ -83,7 +83,7 @@ private:
 };
 
 class KALMOR_API InputSpec {
-public:
+  public:
     static std::shared_ptr<InputSpec> New();
     virtual ~InputSpec();
 
@@ -92,26 +92,26 @@ public:
     // The parameter of that long name, or nullptr.
     std::shared_ptr<ParameterSpec> FindParameter(const std::string& name) const;
 
-private:
+  private:
     std::vector<std::shared_ptr<ParameterSpec>> parameters_;
 };
 
 class KALMOR_API OutputSpec {
-public:
+  public:
     static std::shared_ptr<OutputSpec> New();
     virtual ~OutputSpec();
 
     void SetRootObject(std::shared_ptr<MetaObj::MetaObject> root);
     const std::shared_ptr<MetaObj::MetaObject>& GetRootObject() const { return root_; }
 
-private:
+  private:
     std::shared_ptr<MetaObj::MetaObject> root_;
 };
 
 // The parsed parameters of one invocation. Values are kept in text form: integers in
 // decimal, booleans as "true" or "false", flags as present without value.
 class KALMOR_API Input {
-public:
+  public:
     static std::shared_ptr<Input> New();
     virtual ~Input();
 
@@ -134,13 +134,13 @@ public:
 
     const std::map<std::string, std::vector<std::string>>& GetValues() const { return values_; }
 
-private:
+  private:
     std::map<std::string, std::vector<std::string>> values_;
 };
 
 // What one invocation hands back: a root object (optional), error messages, completion.
 class KALMOR_API Output {
-public:
+  public:
     static std::shared_ptr<Output> New();
     virtual ~Output();
 
@@ -152,7 +152,7 @@ public:
     const std::vector<std::string>& GetErrorMessages() const { return errors_; }
     bool IsComplete() const { return complete_; }
 
-private:
+  private:
     std::shared_ptr<MetaObj::MetaObject> root_;
     std::vector<std::string> errors_;
     bool complete_ = false;
@@ -160,7 +160,7 @@ private:
 
 // Something that describes its input and output.
 class KALMOR_API CallTargetSpec {
-public:
+  public:
     virtual ~CallTargetSpec();
     virtual std::shared_ptr<InputSpec> GetInputSpec() = 0;
     virtual std::shared_ptr<OutputSpec> GetOutputSpec() = 0;
@@ -168,7 +168,7 @@ public:
 
 // Something that can be run.
 class KALMOR_API CallTarget {
-public:
+  public:
     virtual ~CallTarget();
     virtual void Execute(std::shared_ptr<Input> input, std::shared_ptr<Output> output) = 0;
 };

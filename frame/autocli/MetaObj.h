@@ -21,47 +21,47 @@ enum MetaType {
 };
 
 class KALMOR_API MetaObject {
-public:
+  public:
     virtual ~MetaObject();
     virtual MetaType GetType() const = 0;
 };
 
 // A scalar made without a value is "empty": templates use it, formatters show it blank.
 class KALMOR_API MetaString : public MetaObject {
-public:
+  public:
     static std::shared_ptr<MetaString> New();
     static std::shared_ptr<MetaString> New(const std::string& value);
     MetaType GetType() const override;
     bool HasValue() const { return hasValue_; }
     const std::string& GetValue() const { return value_; }
 
-private:
+  private:
     bool hasValue_ = false;
     std::string value_;
 };
 
 class KALMOR_API MetaInt : public MetaObject {
-public:
+  public:
     static std::shared_ptr<MetaInt> New();
     static std::shared_ptr<MetaInt> New(int64_t value);
     MetaType GetType() const override;
     bool HasValue() const { return hasValue_; }
     int64_t GetValue() const { return value_; }
 
-private:
+  private:
     bool hasValue_ = false;
     int64_t value_ = 0;
 };
 
 class KALMOR_API MetaBool : public MetaObject {
-public:
+  public:
     static std::shared_ptr<MetaBool> New();
     static std::shared_ptr<MetaBool> New(bool value);
     MetaType GetType() const override;
     bool HasValue() const { return hasValue_; }
     bool GetValue() const { return value_; }
 
-private:
+  private:
     bool hasValue_ = false;
     bool value_ = false;
 };
@@ -70,7 +70,7 @@ class MetaList;
 
 // A named structure of named, typed fields, kept in the order they were first set.
 class KALMOR_API MetaStruct : public MetaObject {
-public:
+  public:
     struct Field {
         std::string name;
         std::shared_ptr<MetaObject> value;
@@ -98,7 +98,7 @@ public:
     // Returns the field's value, or nullptr when the structure has no such field.
     std::shared_ptr<MetaObject> GetField(const std::string& field) const;
 
-private:
+  private:
     void SetAny(const std::string& field, std::shared_ptr<MetaObject> value,
                 const std::string& documentation);
 
@@ -109,7 +109,7 @@ private:
 // A list whose elements all have one kind: texts (META_STRING) or structures (META_STRUCT,
 // made with an empty template structure that describes the elements).
 class KALMOR_API MetaList : public MetaObject {
-public:
+  public:
     static std::shared_ptr<MetaList> New(MetaType elementType);
     static std::shared_ptr<MetaList> New(MetaType elementType,
                                          std::shared_ptr<MetaObject> elementTemplate);
@@ -127,7 +127,7 @@ public:
     const std::vector<std::shared_ptr<MetaObject>>& GetElements() const { return elements_; }
     size_t Size() const { return elements_.size(); }
 
-private:
+  private:
     MetaType elementType_ = META_STRING;
     std::shared_ptr<MetaObject> template_;
     std::vector<std::shared_ptr<MetaObject>> elements_;

@@ -11,14 +11,14 @@ namespace Lib {
 namespace Mesk {
 
 class HOSTCTL_API MeskCtlException : public std::exception {
-public:
+  public:
     explicit MeskCtlException(std::string message);
     ~MeskCtlException() override;
     // The text reported to the user.
     const std::string& GetMessage() const { return message_; }
     const char* what() const noexcept override;
 
-private:
+  private:
     std::string message_;
 };
 

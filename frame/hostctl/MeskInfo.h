@@ -15,7 +15,7 @@ namespace Mesk {
 
 // One disk device of the host.
 class HOSTCTL_API MeskDiskLun {
-public:
+  public:
     virtual ~MeskDiskLun();
     // The disk's Mesk UUID.
     virtual Uuid GetUuid() const = 0;
@@ -24,7 +24,7 @@ public:
 };
 
 class HOSTCTL_API MeskInfo {
-public:
+  public:
     virtual ~MeskInfo();
 
     // Fills `luns` with the host's disk devices.
@@ -37,8 +37,7 @@ public:
     virtual bool IsWitness() = 0;
     virtual MeskConfigGeneration GetConfigGeneration() = 0;
     virtual void JoinCluster(const Uuid& clusterUuid, bool witnessNode,
-                             const std::string& preferredFaultDomain, bool wait,
-                             int32_t flags) = 0;
+                             const std::string& preferredFaultDomain, bool wait, int32_t flags) = 0;
     virtual void CreateCluster(const std::string& clusterUuid, bool join, bool wait) = 0;
     virtual void LeaveCluster(bool force) = 0;
     virtual void RestoreClusterConfig(bool boot) = 0;
@@ -47,9 +46,9 @@ public:
     // Unicast agents.
     // Fills `witnesses` with one text per unicast witness configured on this host.
     virtual void GetUnicastWitnesses(std::vector<std::string>& witnesses) = 0;
-    virtual void AddUnicastAgent(const std::string& nodeUuid, bool isWitness,
-                                 bool supportsUnicast, const MeskIpAddress& address, int32_t port,
-                                 bool hasInterface, const std::string& interfaceName) = 0;
+    virtual void AddUnicastAgent(const std::string& nodeUuid, bool isWitness, bool supportsUnicast,
+                                 const MeskIpAddress& address, int32_t port, bool hasInterface,
+                                 const std::string& interfaceName) = 0;
     virtual void RefreshUnicastAgents() = 0;
     // Fills `agents` with one entry per agent: "uuid;isWitness;supportsUnicast;ip;port;iface".
     virtual void GetUnicastAgents(std::vector<std::string>& agents) = 0;
@@ -70,7 +69,8 @@ public:
     // Fills `uuids` with the disks that the cluster service holds for this host.
     virtual void GetMeskDiskUuids(std::vector<Uuid>& uuids) = 0;
     // Fills `info` for the disk with that UUID; `luns` is the host's disk list.
-    virtual void GetDiskInfo(const Uuid& uuid, const std::vector<std::shared_ptr<MeskDiskLun>>& luns,
+    virtual void GetDiskInfo(const Uuid& uuid,
+                             const std::vector<std::shared_ptr<MeskDiskLun>>& luns,
                              MeskDiskInfo& info) = 0;
     virtual void AddDisks(const std::string& ssd, const std::vector<std::string>& disks) = 0;
     virtual void RemoveDisk(const std::string& disk, const std::string& evacuationMode) = 0;
@@ -106,7 +106,7 @@ public:
 
 // The extended info object, with the interfaces' full records.
 class HOSTCTL_API MeskInfo2 : public virtual MeskInfo {
-public:
+  public:
     ~MeskInfo2() override;
     // One record per configured interface, in the library's order.
     virtual std::vector<std::unique_ptr<MeskZuvNicConfig2>> GetZuvNicConfigs() = 0;

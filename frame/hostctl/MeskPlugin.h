@@ -10,14 +10,14 @@
 namespace HostCtl {
 
 class HOSTCTL_API MeskPlugin {
-public:
+  public:
     // Returns a new info object, owned by the caller. May throw MeskCtlException.
     virtual std::unique_ptr<Mesk::MeskInfo> GetMeskInfo() = 0;
     virtual ~MeskPlugin();
 };
 
 class HOSTCTL_API MeskPluginFactory {
-public:
+  public:
     // Returns a new plug-in object, owned by the caller. May throw MeskCtlException.
     static std::unique_ptr<MeskPlugin> GetMeskPlugin();
 };

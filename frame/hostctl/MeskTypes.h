@@ -24,7 +24,7 @@ struct Uuid {
 
 // A tagged IPv4 or IPv6 address: the kind flag selects which of the two is meaningful.
 class HOSTCTL_API MeskIpAddress {
-public:
+  public:
     MeskIpAddress();  // kind unset; assign before reading
     explicit MeskIpAddress(const Network::Ipv4Address& address);
     explicit MeskIpAddress(const Network::Ipv6Address& address);
@@ -39,7 +39,7 @@ public:
     const Network::Ipv4Address& GetIpv4() const { return ipv4_; }
     const Network::Ipv6Address& GetIpv6() const { return ipv6_; }
 
-private:
+  private:
     bool isIpv6_ = false;
     Network::Ipv4Address ipv4_;
     Network::Ipv6Address ipv6_;
@@ -52,7 +52,7 @@ struct MeskClusterConfig {
 };
 
 struct MeskConfigGeneration {
-    std::string uuid;        // may be empty
+    std::string uuid;  // may be empty
     uint64_t generation = 0;
     uint64_t timestamp = 0;  // milliseconds since the epoch
 };
@@ -96,7 +96,7 @@ enum MeskPolicyClass : int32_t {
 
 // The network configuration of one interface.
 class HOSTCTL_API MeskZuvNicConfig {
-public:
+  public:
     const std::string& GetZuvnicName() const { return name_; }
     const std::string& GetIfaceUuid() const { return ifaceUuid_; }
     const MeskIpAddress& GetAgentMulticastGroup() const { return agentGroup_; }
@@ -108,7 +108,7 @@ public:
     // Set by the library when it stores the record.
     void SetIfaceUuid(const std::string& uuid) { ifaceUuid_ = uuid; }
 
-protected:
+  protected:
     MeskZuvNicConfig(std::string name, MeskIpAddress agentGroup, MeskIpAddress masterGroup,
                      int32_t agentPort, int32_t masterPort, int32_t unicastPort, int32_t ttl)
         : name_(std::move(name)),
@@ -119,7 +119,7 @@ protected:
           unicastPort_(unicastPort),
           ttl_(ttl) {}
 
-private:
+  private:
     std::string name_;
     std::string ifaceUuid_;
     MeskIpAddress agentGroup_;
@@ -132,7 +132,7 @@ private:
 
 // The interface configuration with IPv6 groups and traffic types.
 class HOSTCTL_API MeskZuvNicConfig2 : public MeskZuvNicConfig {
-public:
+  public:
     MeskZuvNicConfig2(std::string name, MeskIpAddress agentGroup, MeskIpAddress agentV6Group,
                       MeskIpAddress masterGroup, MeskIpAddress masterV6Group, int32_t agentPort,
                       int32_t masterPort, int32_t unicastPort, int32_t ttl, bool meskTraffic,
@@ -158,7 +158,7 @@ public:
     bool meskTraffic;     // carries general Mesk traffic
     bool witnessTraffic;  // carries witness traffic
 
-private:
+  private:
     MeskIpAddress agentV6Group_;
     MeskIpAddress masterV6Group_;
     std::string options_;

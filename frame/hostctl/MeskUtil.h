@@ -14,7 +14,7 @@ namespace ZuvCtl {
 namespace Mesk {
 
 class HOSTCTL_API MeskUtil {
-public:
+  public:
     // Fills the host's membership view from the cluster directory service.
     static void GetInfoFromKOVRA(std::vector<HostCtl::Mesk::MeskMemberInfo>& members,
                                  std::string& localNodeState, std::string& localNodeUuid,

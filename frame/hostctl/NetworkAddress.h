@@ -11,7 +11,7 @@ namespace Network {
 
 // An IPv4 address, held as a 32-bit number in host byte order.
 class HOSTCTL_API Ipv4Address {
-public:
+  public:
     Ipv4Address();  // 0.0.0.0
     // Throws MeskCtlException when the text is not a dotted-quad IPv4 address.
     explicit Ipv4Address(const std::string& text);
@@ -21,13 +21,13 @@ public:
     std::string GetStringAddress() const;
     uint32_t GetValue() const { return value_; }
 
-private:
+  private:
     uint32_t value_ = 0;
 };
 
 // An IPv6 address, held as the text it was made from.
 class HOSTCTL_API Ipv6Address {
-public:
+  public:
     Ipv6Address();  // the empty text
     // Throws MeskCtlException when the text is not an IPv6 address.
     explicit Ipv6Address(const std::string& text);
@@ -36,7 +36,7 @@ public:
     // The text the address was made from.
     std::string GetStringAddress() const { return text_; }
 
-private:
+  private:
     std::string text_;
 };
 

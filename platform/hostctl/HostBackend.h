@@ -20,7 +20,7 @@
 namespace HostCtlSim {
 
 class HOSTCTL_API HostBackend {
-public:
+  public:
     virtual ~HostBackend();
 
     virtual std::unique_ptr<HostCtl::MeskPlugin> GetMeskPlugin() = 0;

@@ -4,22 +4,22 @@
 
 namespace MeskTest {
 
-using ::testing::_;
-using ::testing::Invoke;
-using ::testing::ReturnRef;
 using Kalmor::MetaObj::MetaBool;
 using Kalmor::MetaObj::MetaInt;
 using Kalmor::MetaObj::MetaList;
 using Kalmor::MetaObj::MetaObject;
 using Kalmor::MetaObj::MetaString;
 using Kalmor::MetaObj::MetaStruct;
+using ::testing::_;
+using ::testing::Invoke;
+using ::testing::ReturnRef;
 
 namespace {
 
 // Forwards every MeskInfo operation to the test's mock; counts its own release.
 template <class Base>
 class InfoForward : public Base {
-public:
+  public:
     InfoForward(MockMeskInfo& target, int& released) : t_(target), released_(released) {}
     ~InfoForward() override { ++released_; }
 
@@ -29,9 +29,7 @@ public:
     void JoinCluster(const Uuid& u, bool w, const std::string& p, bool wait, int32_t f) override {
         t_.JoinCluster(u, w, p, wait, f);
     }
-    void CreateCluster(const std::string& u, bool a, bool b) override {
-        t_.CreateCluster(u, a, b);
-    }
+    void CreateCluster(const std::string& u, bool a, bool b) override { t_.CreateCluster(u, a, b); }
     void LeaveCluster(bool f) override { t_.LeaveCluster(f); }
     void RestoreClusterConfig(bool b) override { t_.RestoreClusterConfig(b); }
     void SetPreferredFaultDomain(const std::string& n) override { t_.SetPreferredFaultDomain(n); }
@@ -90,25 +88,25 @@ public:
     int64_t GetResyncThrottle() override { return t_.GetResyncThrottle(); }
     void SetResyncThrottle(int64_t l) override { t_.SetResyncThrottle(l); }
 
-protected:
+  protected:
     MockMeskInfo& t_;
     int& released_;
 };
 
 class BasicInfo : public InfoForward<HostCtl::Mesk::MeskInfo> {
-public:
+  public:
     using InfoForward::InfoForward;
 };
 
 class ExtendedInfo : public InfoForward<HostCtl::Mesk::MeskInfo2> {
-public:
+  public:
     using InfoForward::InfoForward;
     NicList GetZuvNicConfigs() override { return t_.GetZuvNicConfigs(); }
     bool SetZuvNicConfig(const MeskZuvNicConfig2& c) override { return t_.SetZuvNicConfig(c); }
 };
 
 class FakePlugin : public HostCtl::MeskPlugin {
-public:
+  public:
     FakePlugin(MockHost& host, MockMeskInfo& info) : host_(host), info_(info) {}
     ~FakePlugin() override { ++host_.pluginsReleased; }
 
@@ -126,7 +124,7 @@ public:
         return std::make_unique<ExtendedInfo>(info_, host_.infosReleased);
     }
 
-private:
+  private:
     MockHost& host_;
     MockMeskInfo& info_;
 };
@@ -143,8 +141,9 @@ MockMeskInfo::~MockMeskInfo() = default;
 MockHost::MockHost(MockMeskInfo& info) : info_(info) {
     using Base = HostCtlSim::HostBackend;
     ON_CALL(*this, GetMeskPlugin()).WillByDefault(Invoke([this] { return MakePlugin(); }));
-    ON_CALL(*this, GetFormattedSystemDateTime())
-        .WillByDefault(Invoke([] { return std::string("2026-11-22 10:00:00"); }));
+    ON_CALL(*this, GetFormattedSystemDateTime()).WillByDefault(Invoke([] {
+        return std::string("2026-11-22 10:00:00");
+    }));
     ON_CALL(*this, StringToMeskUuid(_)).WillByDefault(Invoke([this](const std::string& t) {
         return Base::StringToMeskUuid(t);
     }));
@@ -183,9 +182,13 @@ Uuid UuidOf(const std::string& text) {
     return HostCtlSim::CurrentBackend().HostBackend::StringToMeskUuid(text);
 }
 
-HostTest::HostTest() { HostCtlSim::SetBackend(&host); }
+HostTest::HostTest() {
+    HostCtlSim::SetBackend(&host);
+}
 
-HostTest::~HostTest() { HostCtlSim::SetBackend(nullptr); }
+HostTest::~HostTest() {
+    HostCtlSim::SetBackend(nullptr);
+}
 
 std::shared_ptr<Kalmor::CallSpec::Output> HostTest::Run(
     Kalmor::AutoCli::Command& command, std::shared_ptr<Kalmor::CallSpec::Input> input) {

@@ -38,7 +38,7 @@ using LunList = std::vector<std::shared_ptr<MeskDiskLun>>;
 using NicList = std::vector<std::unique_ptr<MeskZuvNicConfig2>>;
 
 class MockMeskInfo : public HostCtl::Mesk::MeskInfo2 {
-public:
+  public:
     MockMeskInfo();
     ~MockMeskInfo() override;
 
@@ -66,8 +66,7 @@ public:
     MOCK_METHOD(void, RestoreNetworkConfig, (), (override));
     MOCK_METHOD(void, GetMeskDiskUuids, (std::vector<Uuid>&), (override));
     MOCK_METHOD(void, GetDiskInfo, (const Uuid&, const LunList&, MeskDiskInfo&), (override));
-    MOCK_METHOD(void, AddDisks, (const std::string&, const std::vector<std::string>&),
-                (override));
+    MOCK_METHOD(void, AddDisks, (const std::string&, const std::vector<std::string>&), (override));
     MOCK_METHOD(void, RemoveDisk, (const std::string&, const std::string&), (override));
     MOCK_METHOD(void, RemoveDiskGroup, (const std::string&, const std::string&), (override));
     MOCK_METHOD(void, RemoveDiskByUuid, (const std::string&, const std::string&), (override));
@@ -106,7 +105,7 @@ enum class InfoKind {
 };
 
 class MockHost : public HostCtlSim::HostBackend {
-public:
+  public:
     // By default GetMeskPlugin hands out a plug-in whose info objects forward to `info`, and
     // the conversions and UUID functions behave as the real library's.
     explicit MockHost(MockMeskInfo& info);
@@ -115,8 +114,8 @@ public:
     MOCK_METHOD(std::unique_ptr<HostCtl::MeskPlugin>, GetMeskPlugin, (), (override));
     MOCK_METHOD(void, GetMeskDisks, (LunList&), (override));
     MOCK_METHOD(void, GetInfoFromKOVRA,
-                (std::vector<MeskMemberInfo>&, std::string&, std::string&, std::string&,
-                 uint64_t&, std::string&, std::string&, std::string&, std::string&),
+                (std::vector<MeskMemberInfo>&, std::string&, std::string&, std::string&, uint64_t&,
+                 std::string&, std::string&, std::string&, std::string&),
                 (override));
     MOCK_METHOD(void, GetUnicastMode, (bool&), (override));
     MOCK_METHOD(bool, IsInStretchedCluster, (), (override));
@@ -146,18 +145,18 @@ public:
 
     std::unique_ptr<HostCtl::MeskPlugin> MakePlugin();
 
-private:
+  private:
     MockMeskInfo& info_;
 };
 
 // A disk device with a fixed name and UUID.
 class FakeLun : public MeskDiskLun {
-public:
+  public:
     FakeLun(std::string name, Uuid uuid) : name_(std::move(name)), uuid_(uuid) {}
     Uuid GetUuid() const override { return uuid_; }
     std::string GetName() const override { return name_; }
 
-private:
+  private:
     std::string name_;
     Uuid uuid_;
 };
@@ -172,7 +171,7 @@ inline auto Fail(const std::string& message) {
 
 // Base fixture of the command tests: installs the double for the test's lifetime.
 class HostTest : public ::testing::Test {
-protected:
+  protected:
     HostTest();
     ~HostTest() override;
 

@@ -1,0 +1,27 @@
+// `mesk cluster get`
+#pragma once
+
+#include <memory>
+
+#include "autocli/AutoCli.h"
+
+namespace OrvaneCli {
+namespace MeskNamespace {
+
+class ClusterGet : public virtual Kalmor::AutoCli::Command {
+  public:
+    static std::shared_ptr<ClusterGet> New();
+    ClusterGet();
+    ~ClusterGet() override;
+
+    std::shared_ptr<Kalmor::CallSpec::InputSpec> GetInputSpecInternal() override;
+    std::shared_ptr<Kalmor::CallSpec::OutputSpec> GetOutputSpecInternal() override;
+    void ExecuteInternal(std::shared_ptr<Kalmor::CallSpec::Input> input,
+                         std::shared_ptr<Kalmor::CallSpec::Output> output) override;
+
+    // Builds the "MeskClusterGet" structure with all sixteen fields empty.
+    std::shared_ptr<Kalmor::MetaObj::MetaStruct> GetOutputStructure();
+};
+
+}  // namespace MeskNamespace
+}  // namespace OrvaneCli

@@ -1,0 +1,24 @@
+// `mesk cluster unicastagent add`
+#pragma once
+
+#include <memory>
+
+#include "autocli/AutoCli.h"
+
+namespace OrvaneCli {
+namespace MeskNamespace {
+
+class ClusterUnicastAgentAdd : public virtual Kalmor::AutoCli::Command {
+  public:
+    static std::shared_ptr<ClusterUnicastAgentAdd> New();
+    ClusterUnicastAgentAdd();
+    ~ClusterUnicastAgentAdd() override;
+
+    std::shared_ptr<Kalmor::CallSpec::InputSpec> GetInputSpecInternal() override;
+    std::shared_ptr<Kalmor::CallSpec::OutputSpec> GetOutputSpecInternal() override;
+    void ExecuteInternal(std::shared_ptr<Kalmor::CallSpec::Input> input,
+                         std::shared_ptr<Kalmor::CallSpec::Output> output) override;
+};
+
+}  // namespace MeskNamespace
+}  // namespace OrvaneCli

@@ -1,0 +1,27 @@
+// `mesk resync bandwidth get`
+#pragma once
+
+#include <memory>
+
+#include "autocli/AutoCli.h"
+
+namespace OrvaneCli {
+namespace MeskNamespace {
+
+class ResyncBandwidthGet : public Kalmor::AutoCli::Command {
+  public:
+    static std::shared_ptr<ResyncBandwidthGet> New();
+    ResyncBandwidthGet();
+    ~ResyncBandwidthGet() override;
+
+    std::shared_ptr<Kalmor::CallSpec::InputSpec> GetInputSpecInternal() override;
+    std::shared_ptr<Kalmor::CallSpec::OutputSpec> GetOutputSpecInternal() override;
+    void ExecuteInternal(std::shared_ptr<Kalmor::CallSpec::Input> input,
+                         std::shared_ptr<Kalmor::CallSpec::Output> output) override;
+
+    // Builds the empty "ResyncBandwidth" structure.
+    std::shared_ptr<Kalmor::MetaObj::MetaStruct> GetOutputStructure();
+};
+
+}  // namespace MeskNamespace
+}  // namespace OrvaneCli

@@ -1,0 +1,23 @@
+// `mesk resync throttle set`
+#pragma once
+
+#include <memory>
+
+#include "autocli/AutoCli.h"
+
+namespace OrvaneCli {
+namespace MeskNamespace {
+
+class ResyncThrottleSet : public virtual Kalmor::AutoCli::Command {
+  public:
+    static std::shared_ptr<ResyncThrottleSet> New();
+    ResyncThrottleSet();
+    std::shared_ptr<Kalmor::CallSpec::InputSpec> GetInputSpecInternal() override;
+    std::shared_ptr<Kalmor::CallSpec::OutputSpec> GetOutputSpecInternal() override;
+    void ExecuteInternal(std::shared_ptr<Kalmor::CallSpec::Input> input,
+                         std::shared_ptr<Kalmor::CallSpec::Output> output) override;
+    ~ResyncThrottleSet() override;
+};
+
+}  // namespace MeskNamespace
+}  // namespace OrvaneCli

@@ -1,0 +1,61 @@
+#include "commands/settings/DatastoreNameGet.h"
+
+#include "MeskConstants.h"
+#include "hostctl/MeskCtlException.h"
+#include "hostctl/MeskPlugin.h"
+
+namespace OrvaneCli {
+namespace MeskNamespace {
+
+using HostCtl::Lib::Mesk::MeskCtlException;
+using Kalmor::CallSpec::Input;
+using Kalmor::CallSpec::InputSpec;
+using Kalmor::CallSpec::Output;
+using Kalmor::CallSpec::OutputSpec;
+using Kalmor::MetaObj::MetaString;
+using Kalmor::MetaObj::MetaStruct;
+
+std::shared_ptr<DatastoreNameGet> DatastoreNameGet::New() {
+    return std::make_shared<DatastoreNameGet>();
+}
+
+DatastoreNameGet::DatastoreNameGet() {
+    SetDescription("Get Mesk datastore name.");
+    SetMetaDataField("type", "fetcher");
+    SetDefaultOutputFormatter("simple");
+}
+
+DatastoreNameGet::~DatastoreNameGet() = default;
+
+std::shared_ptr<InputSpec> DatastoreNameGet::GetInputSpecInternal() {
+    return InputSpec::New();
+}
+
+std::shared_ptr<OutputSpec> DatastoreNameGet::GetOutputSpecInternal() {
+    auto spec = OutputSpec::New();
+    spec->SetRootObject(GetOutputStructure());
+    return spec;
+}
+
+std::shared_ptr<MetaStruct> DatastoreNameGet::GetOutputStructure() {
+    auto structure = MetaStruct::New("DatastoreName");
+    structure->SetField("Name", MetaString::New(), MetaStruct::_docEmpty);
+    return structure;
+}
+
+void DatastoreNameGet::ExecuteInternal(std::shared_ptr<Input> /*input*/,
+                                       std::shared_ptr<Output> output) {
+    try {
+        auto result = GetOutputStructure();
+        auto plugin = HostCtl::MeskPluginFactory::GetMeskPlugin();
+        auto info = plugin->GetMeskInfo();
+        result->SetField("Name", MetaString::New(info->GetDatastoreName()), MetaStruct::_docEmpty);
+        output->SetRootObject(result);
+        output->SetComplete();
+    } catch (const MeskCtlException& e) {
+        output->AddErrorMessage("Unable to get Mesk datastore name: " + e.GetMessage());
+    }
+}
+
+}  // namespace MeskNamespace
+}  // namespace OrvaneCli

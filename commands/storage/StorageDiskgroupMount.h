@@ -1,0 +1,23 @@
+// `mesk storage diskgroup mount`
+#pragma once
+
+#include <memory>
+
+#include "autocli/AutoCli.h"
+
+namespace OrvaneCli {
+namespace MeskNamespace {
+
+class StorageDiskgroupMount : public virtual Kalmor::AutoCli::Command {
+  public:
+    static std::shared_ptr<StorageDiskgroupMount> New();
+    StorageDiskgroupMount();
+    std::shared_ptr<Kalmor::CallSpec::InputSpec> GetInputSpecInternal() override;
+    std::shared_ptr<Kalmor::CallSpec::OutputSpec> GetOutputSpecInternal() override;
+    void ExecuteInternal(std::shared_ptr<Kalmor::CallSpec::Input> input,
+                         std::shared_ptr<Kalmor::CallSpec::Output> output) override;
+    ~StorageDiskgroupMount() override;
+};
+
+}  // namespace MeskNamespace
+}  // namespace OrvaneCli

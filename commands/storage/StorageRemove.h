@@ -1,0 +1,24 @@
+// `mesk storage remove`
+#pragma once
+
+#include <memory>
+
+#include "autocli/AutoCli.h"
+
+namespace OrvaneCli {
+namespace MeskNamespace {
+
+class StorageRemove : public virtual Kalmor::AutoCli::Command {
+  public:
+    static std::shared_ptr<StorageRemove> New();
+    StorageRemove();
+    ~StorageRemove() override;
+
+    std::shared_ptr<Kalmor::CallSpec::InputSpec> GetInputSpecInternal() override;
+    std::shared_ptr<Kalmor::CallSpec::OutputSpec> GetOutputSpecInternal() override;
+    void ExecuteInternal(std::shared_ptr<Kalmor::CallSpec::Input> input,
+                         std::shared_ptr<Kalmor::CallSpec::Output> output) override;
+};
+
+}  // namespace MeskNamespace
+}  // namespace OrvaneCli
