@@ -41,7 +41,6 @@ std::shared_ptr<InputSpec> ClusterUnicastAgentAdd::GetInputSpecInternal() {
 
     auto type = ParameterSpec::New("type", Kalmor::CallSpec::PARAM_STRING);
     type->SetShortName("t");
-    type->SetRequired(false);
     type->SetDescription("Type of the unicast agent (One of %ENUM%, default is witness).");
     auto types = ParameterConstraint::New(Kalmor::CallSpec::CONSTRAINT_STRING_ENUM);
     types->AddStringEnum("witness", "");
@@ -51,13 +50,11 @@ std::shared_ptr<InputSpec> ClusterUnicastAgentAdd::GetInputSpecInternal() {
 
     auto uuid = ParameterSpec::New("uuid", Kalmor::CallSpec::PARAM_STRING);
     uuid->SetShortName("u");
-    uuid->SetRequired(false);
     uuid->SetDescription("UUID of the unicast agent (required for -t node).");
     spec->AddParameter(uuid);
 
     auto unicast = ParameterSpec::New("supports-unicast", Kalmor::CallSpec::PARAM_BOOL);
     unicast->SetShortName("U");
-    unicast->SetRequired(false);
     unicast->SetDescription("Whether the software version supports unicast (required for -t node)");
     spec->AddParameter(unicast);
 
@@ -69,13 +66,11 @@ std::shared_ptr<InputSpec> ClusterUnicastAgentAdd::GetInputSpecInternal() {
 
     auto port = ParameterSpec::New("port", Kalmor::CallSpec::PARAM_INT);
     port->SetShortName("p");
-    port->SetRequired(false);
     port->SetDescription("Port the unicast agent is listening on.");
     spec->AddParameter(port);
 
     auto iface = ParameterSpec::New("bound-interface-name", Kalmor::CallSpec::PARAM_STRING);
     iface->SetShortName("i");
-    iface->SetRequired(false);
     iface->SetDescription("Name of the bound outgoing network interface.");
     spec->AddParameter(iface);
 
@@ -160,7 +155,7 @@ void ClusterUnicastAgentAdd::ExecuteInternal(std::shared_ptr<Input> input,
 
         info->AddUnicastAgent(nodeUuid, isWitness, supportsUnicast, address, port, hasInterface,
                               interfaceName);
-        // A new node changes the peers that the cluster service reaches; a witness does not.
+        // A node joins the peers that the cluster service refreshes; a witness needs no refresh.
         if (!isWitness) {
             info->RefreshUnicastAgents();
         }
