@@ -55,8 +55,7 @@ std::shared_ptr<OutputSpec> FaultDomainSet::GetOutputSpecInternal() {
     return spec;
 }
 
-void FaultDomainSet::ExecuteInternal(std::shared_ptr<Input> input,
-                                     std::shared_ptr<Output> output) {
+void FaultDomainSet::ExecuteInternal(std::shared_ptr<Input> input, std::shared_ptr<Output> output) {
     const std::string name = input->GetParameter("fdname");
     // The limit counts bytes, not characters: a multi-byte name is refused with fewer than
     // 256 characters.
