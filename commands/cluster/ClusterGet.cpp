@@ -108,8 +108,7 @@ std::shared_ptr<MetaStruct> ClusterGet::GetOutputStructure() {
     return structure;
 }
 
-void ClusterGet::ExecuteInternal(std::shared_ptr<Input> /*input*/,
-                                 std::shared_ptr<Output> output) {
+void ClusterGet::ExecuteInternal(std::shared_ptr<Input> /*input*/, std::shared_ptr<Output> output) {
     const std::string& doc = MetaStruct::_docEmpty;
     auto result = GetOutputStructure();
     try {
@@ -130,10 +129,9 @@ void ClusterGet::ExecuteInternal(std::shared_ptr<Input> /*input*/,
             std::string masterUuid;
             std::string backupUuid;
             std::string maintenanceModeState;
-            MeskUtil::GetInfoFromKOVRA(members, localNodeState, localNodeUuid,
-                                       localNodeHealthState, membershipEntryRevision,
-                                       membershipUuid, masterUuid, backupUuid,
-                                       maintenanceModeState);
+            MeskUtil::GetInfoFromKOVRA(members, localNodeState, localNodeUuid, localNodeHealthState,
+                                       membershipEntryRevision, membershipUuid, masterUuid,
+                                       backupUuid, maintenanceModeState);
 
             bool unicastMode = false;
             MeskUtil::GetUnicastMode(unicastMode);
@@ -156,8 +154,7 @@ void ClusterGet::ExecuteInternal(std::shared_ptr<Input> /*input*/,
             result->SetField("Local Node UUID", MetaString::New(localNodeUuid), doc);
             result->SetField("Local Node Type", MetaString::New(nodeType), doc);
             result->SetField("Local Node State", MetaString::New(localNodeState), doc);
-            result->SetField("Local Node Health State", MetaString::New(localNodeHealthState),
-                             doc);
+            result->SetField("Local Node Health State", MetaString::New(localNodeHealthState), doc);
             result->SetField("Sub-Cluster Master UUID", MetaString::New(masterUuid), doc);
             result->SetField("Sub-Cluster Backup UUID", MetaString::New(backupUuid), doc);
             result->SetField("Sub-Cluster UUID", MetaString::New(config.clusterUuid), doc);
@@ -168,8 +165,7 @@ void ClusterGet::ExecuteInternal(std::shared_ptr<Input> /*input*/,
             result->SetField("Sub-Cluster Member UUIDs", memberUuids, doc);
             result->SetField("Sub-Cluster Membership UUID", MetaString::New(membershipUuid), doc);
             result->SetField("Unicast Mode Enabled", MetaBool::New(unicastMode), doc);
-            result->SetField("Maintenance Mode State", MetaString::New(maintenanceModeState),
-                             doc);
+            result->SetField("Maintenance Mode State", MetaString::New(maintenanceModeState), doc);
             result->SetField("Config Generation", MetaString::New(configGeneration), doc);
         }
     } catch (const MeskCtlException& e) {
