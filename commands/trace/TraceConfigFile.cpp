@@ -18,13 +18,14 @@ bool BeginsWith(const std::string& line, const char* key) {
     return line.rfind(key, 0) == 0;
 }
 
-// Stream extraction of a value: leading white space skipped, reading stops at the first
-// character that cannot belong to it; a value that cannot be read at all gives 0 (false).
+// Stream extraction of a decimal number, or of a flag in numeric form ("0" or "1"): leading
+// white space is skipped and reading stops at the first character that cannot belong to the
+// value; a value that cannot be read gives what the extraction stores (0 or false).
 template <typename T>
-T Extract(const std::string& value, std::ios_base& (*base)(std::ios_base&)) {
+T Extract(const std::string& value) {
     T result{};
     std::istringstream stream(value);
-    stream >> base >> result;
+    stream >> result;
     return result;
 }
 
@@ -44,11 +45,11 @@ TraceSettings ReadTraceSettings(std::istream& in) {
             directory.erase(std::remove(directory.begin(), directory.end(), '"'), directory.end());
             settings.directory = directory;
         } else if (KeyAt(line, TRACE_KEY_ROTATE_MAX_FILES, start)) {
-            settings.maxFiles = Extract<int32_t>(value, std::dec);
+            settings.maxFiles = Extract<int32_t>(value);
         } else if (KeyAt(line, TRACE_KEY_ROTATE_FILE_SIZE, start)) {
-            settings.fileSizeMb = Extract<int32_t>(value, std::dec);
+            settings.fileSizeMb = Extract<int32_t>(value);
         } else if (KeyAt(line, TRACE_KEY_LOG_URGENT_TO_SYSLOG, start)) {
-            settings.logUrgentToSyslog = Extract<bool>(value, std::noboolalpha);
+            settings.logUrgentToSyslog = Extract<bool>(value);
         }
     }
     return settings;
