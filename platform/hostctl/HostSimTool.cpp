@@ -1,0 +1,297 @@
+// hostsim: sets up, inspects and fault-injects the simulated host that the host-control
+// library serves. It shares the host with autocli through HOSTSIM_STATE and MESK_HOST_ROOT.
+#include <cerrno>
+#include <cstdio>
+#include <cstdlib>
+#include <fstream>
+#include <iostream>
+#include <iterator>
+#include <sstream>
+#include <string>
+#include <vector>
+
+#include "HostRoot.h"
+#include "SimHost.h"
+#include "StateDocument.h"
+#include "StateStore.h"
+
+using HostCtlSim::CallRecord;
+using HostCtlSim::HostRoot;
+using HostCtlSim::Json;
+using HostCtlSim::SimHost;
+using HostCtlSim::StateStore;
+
+namespace {
+
+const char* const kUsage = R"(Usage: hostsim COMMAND [ARGUMENTS]
+
+Sets up and inspects the simulated host behind the host-control library. The host's state is
+the database HOSTSIM_STATE (default /var/lib/hostsim/state.db); its files lie below
+MESK_HOST_ROOT (default /var/lib/hostsim/root).
+
+Commands:
+  reset                       a fresh host: no cluster, one SSD and three HDDs unclaimed, no
+                              interfaces, no unicast agents, no default policies, the tracing
+                              service running; clears injected failures and the call log
+  show                        prints the whole host as one JSON document
+  load [--merge] FILE|-       replaces the host by such a document (from standard input for -);
+                              with --merge, FILE holds only the keys to change (a JSON merge
+                              patch over the current host)
+  fail OPERATION MESSAGE [--call N]
+                              makes every call of OPERATION (only the Nth of each invocation
+                              with --call) throw MeskCtlException with MESSAGE
+  fail --clear                removes every injected failure
+  fail --list                 prints the injected failures, one JSON object a line
+  calls [--clear]             prints the host-control operations of the last invocation and
+                              the host scripts it ran, in order, one JSON object a line;
+                              --clear empties the log
+  service mesktraced running|stopped|status-fails|restart-fails [N]
+                              sets how the tracing service's control script behaves: status
+                              exits 0 (running) or 3 (stopped); status-fails makes the status
+                              check die by a signal; restart-fails makes the next N restarts
+                              (every restart without N) exit 1
+  populate --luns N [--agents N] [--nics N]
+                              a host in a cluster with N disks claimed into disk groups of one
+                              SSD and up to seven HDDs, N unicast agents and N interfaces
+  --help                      this text
+)";
+
+class UsageError : public std::runtime_error {
+  public:
+    using std::runtime_error::runtime_error;
+};
+
+int64_t Number(const std::string& text, const char* what, int64_t lowest, int64_t highest) {
+    errno = 0;
+    char* end = nullptr;
+    long long value = std::strtoll(text.c_str(), &end, 10);
+    if (text.empty() || *end != '\0' || errno == ERANGE || value < lowest || value > highest) {
+        throw UsageError(std::string(what) + " must be a whole number from " +
+                         std::to_string(lowest) + " to " + std::to_string(highest) + ", not '" +
+                         text + "'");
+    }
+    return value;
+}
+
+struct Host {
+    SimHost::Options options = SimHost::OptionsFromEnvironment();
+    StateStore store{options.statePath};
+    HostRoot root{options.hostRoot};
+
+    StateStore& Open() {
+        if (store.Open()) root.Create(HostCtlSim::DefaultHost()["services"]);
+        return store;
+    }
+
+    Json Document() {
+        Json document = Open().Dump();
+        document["services"] = root.ReadServices();
+        return document;
+    }
+
+    // Replaces the whole host by a normalized document; `fresh` also renews the host's files
+    // and forgets the injected failures and the call log.
+    void Replace(const Json& document, bool fresh) {
+        Open();
+        StateStore::Transaction transaction(store);
+        store.Replace(document);
+        if (fresh) {
+            store.ClearFaults();
+            store.ClearCalls();
+        }
+        transaction.Commit();
+        if (fresh) {
+            root.Create(document["services"]);
+        } else {
+            root.WriteServices(document["services"]);
+        }
+    }
+};
+
+std::string ReadInput(const std::string& file) {
+    if (file == "-") {
+        return std::string(std::istreambuf_iterator<char>(std::cin),
+                           std::istreambuf_iterator<char>());
+    }
+    std::ifstream in(file, std::ios::binary);
+    if (!in) throw std::runtime_error("cannot read " + file);
+    std::ostringstream text;
+    text << in.rdbuf();
+    return text.str();
+}
+
+int Load(const std::vector<std::string>& args) {
+    bool merge = !args.empty() && args[0] == "--merge";
+    if (args.size() != (merge ? 2u : 1u)) throw UsageError("load takes [--merge] FILE or -");
+    Json input = Json::parse(ReadInput(args.back()), nullptr, false);
+    if (input.is_discarded()) throw std::runtime_error(args.back() + ": not a JSON document");
+    Host host;
+    Json document = input;
+    if (merge) {
+        document = host.Document();
+        document.merge_patch(input);
+    }
+    host.Replace(HostCtlSim::NormalizeHost(document), false);
+    return 0;
+}
+
+int Fail(const std::vector<std::string>& args) {
+    Host host;
+    if (args.size() == 1 && args[0] == "--clear") {
+        host.Open().ClearFaults();
+        return 0;
+    }
+    if (args.size() == 1 && args[0] == "--list") {
+        for (const auto& fault : host.Open().ReadFaults()) {
+            Json line;
+            line["op"] = fault.op;
+            line["call"] = fault.call;
+            line["message"] = fault.message;
+            std::cout << HostCtlSim::JsonText(line) << "\n";
+        }
+        return 0;
+    }
+    HostCtlSim::Fault fault;
+    if (args.size() == 2) {
+        fault.call = 0;
+    } else if (args.size() == 4 && args[2] == "--call") {
+        fault.call = Number(args[3], "--call", 1, 1000000000);
+    } else {
+        throw UsageError("fail takes OPERATION MESSAGE [--call N], --clear or --list");
+    }
+    fault.op = args[0];
+    fault.message = args[1];
+    const auto& names = SimHost::OperationNames();
+    if (std::find(names.begin(), names.end(), fault.op) == names.end()) {
+        std::string known;
+        for (const auto& name : names) known += (known.empty() ? "" : ", ") + name;
+        throw UsageError("unknown operation '" + fault.op + "'; the operations are: " + known);
+    }
+    host.Open().SetFault(fault);
+    return 0;
+}
+
+int Calls(const std::vector<std::string>& args) {
+    Host host;
+    if (args.size() == 1 && args[0] == "--clear") {
+        host.Open().ClearCalls();
+        host.root.ClearScriptLog();
+        return 0;
+    }
+    if (!args.empty()) throw UsageError("calls takes no argument but --clear");
+    std::vector<CallRecord> calls = host.Open().ReadCalls();
+    std::vector<CallRecord> scripts = host.root.ReadScriptLog();
+    // Script runs of earlier invocations are left out.
+    int64_t since = calls.empty() ? INT64_MIN : calls.front().time;
+    size_t s = 0;
+    while (s < scripts.size() && scripts[s].time < since) ++s;
+    for (const CallRecord& call : calls) {
+        while (s < scripts.size() && scripts[s].time < call.time) {
+            std::cout << scripts[s++].entry << "\n";
+        }
+        std::cout << call.entry << "\n";
+    }
+    while (s < scripts.size()) std::cout << scripts[s++].entry << "\n";
+    return 0;
+}
+
+int Service(const std::vector<std::string>& args) {
+    if (args.size() < 2 || args[0] != "mesktraced") {
+        throw UsageError("service takes mesktraced running|stopped|status-fails|restart-fails [N]");
+    }
+    Host host;
+    host.Open();
+    Json services = host.root.ReadServices();
+    Json& trace = services["mesktraced"];
+    const std::string& mode = args[1];
+    size_t expected = 2;
+    if (mode == "running" || mode == "stopped") {
+        trace["state"] = mode;
+        trace["statusFails"] = false;
+        trace["restartFailures"] = 0;
+    } else if (mode == "status-fails") {
+        trace["statusFails"] = true;
+    } else if (mode == "restart-fails") {
+        trace["restartFailures"] = -1;
+        if (args.size() == 3) {
+            trace["restartFailures"] = Number(args[2], "N", 1, INT32_MAX);
+            expected = 3;
+        }
+    } else {
+        throw UsageError("unknown service behaviour '" + mode +
+                         "'; use running, stopped, status-fails or restart-fails [N]");
+    }
+    if (args.size() != expected) throw UsageError("too many arguments to service");
+    host.root.WriteServices(services);
+    return 0;
+}
+
+int Populate(const std::vector<std::string>& args) {
+    int64_t luns = -1, agents = 0, nics = 0;
+    for (size_t i = 0; i < args.size(); i += 2) {
+        if (i + 1 >= args.size()) throw UsageError(args[i] + " needs a number");
+        int64_t value = Number(args[i + 1], args[i].c_str(), 0, 1000000);
+        if (args[i] == "--luns") {
+            luns = value;
+        } else if (args[i] == "--agents") {
+            agents = value;
+        } else if (args[i] == "--nics") {
+            nics = value;
+        } else {
+            throw UsageError("unknown option " + args[i]);
+        }
+    }
+    if (luns < 0) throw UsageError("populate needs --luns N");
+    Host host;
+    host.Replace(HostCtlSim::NormalizeHost(HostCtlSim::PopulatedHost(luns, agents, nics)), true);
+    return 0;
+}
+
+int Run(const std::string& command, const std::vector<std::string>& args) {
+    if (command == "reset") {
+        if (!args.empty()) throw UsageError("reset takes no argument");
+        Host host;
+        host.Replace(HostCtlSim::NormalizeHost(HostCtlSim::DefaultHost()), true);
+        return 0;
+    }
+    if (command == "show") {
+        if (!args.empty()) throw UsageError("show takes no argument");
+        std::cout << Host().Document().dump(2, ' ', false, Json::error_handler_t::replace) << "\n";
+        return 0;
+    }
+    if (command == "load") return Load(args);
+    if (command == "fail") return Fail(args);
+    if (command == "calls") return Calls(args);
+    if (command == "service") return Service(args);
+    if (command == "populate") return Populate(args);
+    throw UsageError("unknown command '" + command + "'");
+}
+
+}  // namespace
+
+int main(int argc, char** argv) {
+    std::vector<std::string> args(argv + 1, argv + argc);
+    if (args.empty()) {
+        std::cerr << kUsage;
+        return 1;
+    }
+    if (args[0] == "--help" || args[0] == "-h" || args[0] == "help") {
+        std::cout << kUsage;
+        return 0;
+    }
+    std::string command = args[0];
+    args.erase(args.begin());
+    try {
+        int status = Run(command, args);
+        std::cout.flush();
+        return status;
+    } catch (const UsageError& error) {
+        std::cerr << "hostsim " << command << ": " << error.what() << "\n"
+                  << "Run 'hostsim --help' for the commands.\n";
+    } catch (const HostCtlSim::DocumentError& error) {
+        std::cerr << "hostsim " << command << ": invalid host document: " << error.what() << "\n";
+    } catch (const std::exception& error) {
+        std::cerr << "hostsim " << command << ": " << error.what() << "\n";
+    }
+    return 1;
+}

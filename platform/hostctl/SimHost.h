@@ -1,0 +1,114 @@
+// The simulated host: the default backend of the host-control library.
+//
+// Its state lives in a StateStore (opened on the first call that needs it) and its files in
+// a HostRoot. Every host-control operation it serves is recorded, with its arguments, in the
+// call log of the current invocation (one SimHost object is one invocation) and first
+// consults the injected failures, so that any call can be made to throw.
+#pragma once
+
+#include <map>
+#include <memory>
+#include <string>
+#include <vector>
+
+#include "HostBackend.h"
+#include "HostRoot.h"
+#include "StateDocument.h"
+#include "StateStore.h"
+
+namespace HostCtlSim {
+
+class SimHost : public HostBackend {
+  public:
+    struct Options {
+        std::string statePath;  // the state database
+        std::string hostRoot;   // the root directory of the host's files
+        // Where MeskExec looks for programs: below this directory, or at the path as given
+        // when it is empty.
+        std::string execRoot;
+    };
+
+    // HOSTSIM_STATE (default /var/lib/hostsim/state.db) and MESK_HOST_ROOT (default
+    // /var/lib/hostsim/root; programs run at their own paths when it is unset).
+    static Options OptionsFromEnvironment();
+    // The process's simulated host, made on first use from the environment.
+    static SimHost& Default();
+    // Every operation name that the call log and the injected failures use.
+    static const std::vector<std::string>& OperationNames();
+
+    explicit SimHost(Options options);
+    // Writes what is left of the call log.
+    ~SimHost() override;
+
+    // The state, opened (a missing database is made a fresh host, with its files).
+    StateStore& Store();
+    const HostRoot& Root() const { return root_; }
+
+    std::unique_ptr<HostCtl::MeskPlugin> GetMeskPlugin() override;
+    void GetMeskDisks(std::vector<std::shared_ptr<HostCtl::Mesk::MeskDiskLun>>& luns) override;
+    void GetInfoFromKOVRA(std::vector<HostCtl::Mesk::MeskMemberInfo>& members,
+                          std::string& localNodeState, std::string& localNodeUuid,
+                          std::string& localNodeHealthState, uint64_t& membershipEntryRevision,
+                          std::string& membershipUuid, std::string& masterUuid,
+                          std::string& backupUuid, std::string& maintenanceModeState) override;
+    void GetUnicastMode(bool& unicast) override;
+    bool IsInStretchedCluster() override;
+    void GetPreferredFaultDomainInfo(std::string& id, std::string& name) override;
+    bool IsWitnessNode() override;
+    std::string GetFaultDomainId() override;
+    void DecomCancel() override;
+    int32_t MeskExec(const std::string& command, const std::string& argument, bool flag1,
+                     bool flag2, bool flag3) override;
+    std::string GetFormattedSystemDateTime() override;
+    HostCtl::Mesk::Uuid StringToMeskUuid(const std::string& text) override;
+    std::string MeskUuidToString(const HostCtl::Mesk::Uuid& uuid) override;
+    size_t UTF8StringCharLength(const std::string& text) override;
+    HostCtl::Mesk::MeskPolicyClass StringToMeskPolicyClass(const std::string& name) override;
+    std::string MeskPolicyClassToString(HostCtl::Mesk::MeskPolicyClass policyClass) override;
+    std::vector<HostCtl::Mesk::MeskPolicyClass> GetMeskPolicyClasses() override;
+    char* UUID_CreateRandom() override;
+    char* UUID_PackText(const char* text, char* buffer, size_t length) override;
+
+    // Records the call of `op`, then throws the failure injected for it, if any.
+    void Enter(const char* op, Json args);
+    // Notes on the call being served that it threw.
+    void NoteError(const std::string& message);
+    // Runs `change` in one transaction, together with the call log so far.
+    template <class Change>
+    void Modify(Change&& change) {
+        StateStore& store = Store();
+        StateStore::Transaction transaction(store);
+        change(store);
+        store.AppendCalls(invocation_, Pending());
+        transaction.Commit();
+        pending_.clear();
+    }
+    // Writes the calls recorded so far to the call log.
+    void Flush();
+
+  private:
+    std::vector<CallRecord> Pending() const;
+
+    Options options_;
+    HostRoot root_;
+    std::unique_ptr<StateStore> store_;
+    std::string invocation_;
+    std::vector<Fault> faults_;
+    std::map<std::string, int64_t> callCounts_;
+    std::vector<std::pair<int64_t, Json>> pending_;  // time and entry of each call
+};
+
+// Runs `body` as the operation `op` of `host`: recorded, subject to injected failures, and
+// noted in the log when it throws.
+template <class Body>
+auto Serve(SimHost& host, const char* op, Json args, Body&& body) -> decltype(body()) {
+    try {
+        host.Enter(op, std::move(args));
+        return body();
+    } catch (const std::exception& error) {
+        host.NoteError(error.what());
+        throw;
+    }
+}
+
+}  // namespace HostCtlSim
