@@ -518,7 +518,8 @@ class SimInfo : public HostCtl::Mesk::MeskInfo2 {
     std::vector<std::unique_ptr<MeskZuvNicConfig2>> GetZuvNicConfigs() override {
         return Serve(host_, "GetZuvNicConfigs", Json::array(), [&] {
             std::vector<std::unique_ptr<MeskZuvNicConfig2>> records;
-            for (const Json& n : Store().ReadSection("network")["interfaces"]) {
+            Json network = Store().ReadSection("network");
+            for (const Json& n : network["interfaces"]) {
                 records.push_back(InterfaceRecord(n));
             }
             return records;
