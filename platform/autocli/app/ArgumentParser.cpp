@@ -1,0 +1,358 @@
+// The command line: global options, and a command's options checked against its parameters.
+#include "ArgumentParser.h"
+
+#include <cerrno>
+#include <cstdlib>
+#include <set>
+
+#include "Text.h"
+
+namespace Kalmor {
+namespace AutoCli {
+namespace App {
+
+using CallSpec::InputSpec;
+using CallSpec::ParameterConstraint;
+using CallSpec::ParameterSpec;
+
+namespace {
+
+bool StartsWith(const std::string& text, const char* prefix) {
+    return text.rfind(prefix, 0) == 0;
+}
+
+// A word that cannot be the value of the option before it: another long option.
+bool LooksLikeLongOption(const std::string& word) {
+    return StartsWith(word, "--");
+}
+
+// Matches `--name value` and `--name=value` at words[index], moving `index` past them.
+// Returns false when the word is another option.
+bool MatchValueOption(const std::vector<std::string>& words, size_t& index, const char* option,
+                      std::string& value, std::string& error) {
+    const std::string& word = words[index];
+    const std::string name = option;
+    if (word == name) {
+        if (index + 1 >= words.size() || LooksLikeLongOption(words[index + 1])) {
+            error = "option '" + name + "' needs a value";
+            index += 1;
+            return true;
+        }
+        value = words[index + 1];
+        index += 2;
+        return true;
+    }
+    if (StartsWith(word, (name + "=").c_str())) {
+        value = word.substr(name.size() + 1);
+        if (value.empty()) {
+            error = "option '" + name + "' needs a value";
+        }
+        index += 1;
+        return true;
+    }
+    return false;
+}
+
+// Parses a decimal 64-bit integer with an optional sign. Refuses blanks, trailing garbage
+// and values out of range.
+enum class IntParse { Ok, NotANumber, OutOfRange };
+
+IntParse ParseInt64(const std::string& text, int64_t& value) {
+    size_t digits = (!text.empty() && (text[0] == '-' || text[0] == '+')) ? 1 : 0;
+    if (digits == text.size()) {
+        return IntParse::NotANumber;
+    }
+    for (size_t i = digits; i < text.size(); ++i) {
+        if (text[i] < '0' || text[i] > '9') {
+            return IntParse::NotANumber;
+        }
+    }
+    errno = 0;
+    char* end = nullptr;
+    long long parsed = std::strtoll(text.c_str(), &end, 10);
+    if (errno == ERANGE) {
+        return IntParse::OutOfRange;
+    }
+    value = static_cast<int64_t>(parsed);
+    return IntParse::Ok;
+}
+
+bool ParseBool(const std::string& text, bool& value) {
+    std::string lower;
+    for (char c : text) {
+        lower += static_cast<char>(c >= 'A' && c <= 'Z' ? c - 'A' + 'a' : c);
+    }
+    if (lower == "true" || lower == "1") {
+        value = true;
+        return true;
+    }
+    if (lower == "false" || lower == "0") {
+        value = false;
+        return true;
+    }
+    return false;
+}
+
+// No command takes multi-line text: a newline or another control character in a value is
+// almost always a quoting mistake, and would garble the host's configuration files.
+bool HasControlCharacter(const std::string& text) {
+    for (char c : text) {
+        unsigned char byte = static_cast<unsigned char>(c);
+        if ((byte < 0x20 && byte != '\t') || byte == 0x7F) {
+            return true;
+        }
+    }
+    return false;
+}
+
+std::string Quoted(const std::string& text) {
+    return "'" + text + "'";
+}
+
+std::string EnumValues(const ParameterConstraint& constraint) {
+    std::vector<std::string> values;
+    for (const auto& entry : constraint.GetStringEnum()) {
+        values.push_back(entry.value);
+    }
+    return Join(values, ", ");
+}
+
+const ParameterSpec* FindShort(const InputSpec& spec, const std::string& letter) {
+    for (const auto& parameter : spec.GetParameters()) {
+        if (parameter && parameter->GetShortName() == letter) {
+            return parameter.get();
+        }
+    }
+    return nullptr;
+}
+
+// Checks one text value against the parameter's enumeration; returns an error or "".
+std::string CheckText(const ParameterSpec& parameter, const std::string& value) {
+    const std::string option = "--" + parameter.GetName();
+    if (HasControlCharacter(value)) {
+        return "option " + Quoted(option) +
+               " contains a control character; values must be a single line of text";
+    }
+    const auto& constraint = parameter.GetConstraint();
+    if (constraint && constraint->GetType() == CallSpec::CONSTRAINT_STRING_ENUM) {
+        for (const auto& entry : constraint->GetStringEnum()) {
+            if (entry.value == value) {
+                return std::string();
+            }
+        }
+        return "option " + Quoted(option) + " must be one of " + EnumValues(*constraint) +
+               " (got " + Quoted(value) + ")";
+    }
+    return std::string();
+}
+
+// Checks a value and stores it in `input`; returns an error or "".
+std::string Store(const ParameterSpec& parameter, const std::string& value,
+                  CallSpec::Input& input) {
+    const std::string& name = parameter.GetName();
+    const std::string option = Quoted("--" + name);
+    switch (parameter.GetType()) {
+        case CallSpec::PARAM_STRING: {
+            std::string error = CheckText(parameter, value);
+            if (error.empty()) {
+                input.SetParameter(name, value);
+            }
+            return error;
+        }
+        case CallSpec::PARAM_STRING_LIST: {
+            std::string error = CheckText(parameter, value);
+            if (error.empty()) {
+                input.AddParameterValue(name, value);
+            }
+            return error;
+        }
+        case CallSpec::PARAM_INT: {
+            int64_t number = 0;
+            switch (ParseInt64(value, number)) {
+                case IntParse::NotANumber:
+                    return "option " + option + " needs a decimal integer (got " +
+                           Quoted(ValidUtf8(value)) + ")";
+                case IntParse::OutOfRange:
+                    return "option " + option + " is out of the 64-bit integer range (got " +
+                           Quoted(value) + ")";
+                case IntParse::Ok:
+                    break;
+            }
+            const auto& constraint = parameter.GetConstraint();
+            if (constraint && constraint->GetType() == CallSpec::CONSTRAINT_INT_RANGE &&
+                (number < constraint->GetIntMinimum() || number > constraint->GetIntMaximum())) {
+                return "option " + option + " must be between " +
+                       std::to_string(constraint->GetIntMinimum()) + " and " +
+                       std::to_string(constraint->GetIntMaximum()) + " (got " + Quoted(value) + ")";
+            }
+            input.SetParameterInt(name, number);
+            return std::string();
+        }
+        case CallSpec::PARAM_BOOL: {
+            bool flag = false;
+            if (!ParseBool(value, flag)) {
+                return "option " + option + " needs true or false (got " +
+                       Quoted(ValidUtf8(value)) + ")";
+            }
+            input.SetParameterBool(name, flag);
+            return std::string();
+        }
+        case CallSpec::PARAM_FLAG:
+            input.SetFlag(name);
+            return std::string();
+    }
+    return "option " + option + " has a kind that this tool does not know";
+}
+
+// A declaration the parser cannot honour is refused before any word is read, so that the
+// command never runs with a parameter nobody can check.
+std::string CheckDeclarations(const InputSpec& spec) {
+    std::set<std::string> names;
+    for (const auto& parameter : spec.GetParameters()) {
+        if (!parameter) {
+            continue;
+        }
+        const std::string option = Quoted("--" + parameter->GetName());
+        if (!names.insert(parameter->GetName()).second) {
+            return "the command declares " + option + " twice";
+        }
+        const auto& constraint = parameter->GetConstraint();
+        if (constraint && constraint->GetType() == CallSpec::CONSTRAINT_INT_ENUM) {
+            return "the command declares an integer enumeration for " + option +
+                   ", which this tool does not support";
+        }
+    }
+    return std::string();
+}
+
+}  // namespace
+
+bool TakeGlobalOption(const std::vector<std::string>& words, size_t& index, GlobalOptions& globals,
+                      std::string& error) {
+    const std::string& word = words[index];
+    if (word == "--help" || word == "-h") {
+        globals.help = true;
+    } else if (word == "--list-commands") {
+        globals.listCommands = true;
+    } else if (word == "--debug") {
+        globals.debug = true;
+    } else if (word == "--no-header") {
+        globals.noHeader = true;
+    } else {
+        std::string value;
+        if (MatchValueOption(words, index, "--formatter", value, error)) {
+            globals.formatter = value;
+            return true;
+        }
+        if (MatchValueOption(words, index, "--fields", value, error)) {
+            globals.fieldsGiven = true;
+            globals.fields = SplitNames(value);
+            if (error.empty() && globals.fields.empty()) {
+                error = "option '--fields' needs at least one field name";
+            }
+            return true;
+        }
+        return false;
+    }
+    index += 1;
+    return true;
+}
+
+ParseResult ParseArguments(const std::vector<std::string>& words, const InputSpec& spec,
+                           GlobalOptions* globals) {
+    ParseResult result;
+    result.input = CallSpec::Input::New();
+    // Every word is read even after an error, so that a --help anywhere still wins.
+    std::string firstError = CheckDeclarations(spec);
+    const auto fail = [&firstError](const std::string& message) {
+        if (firstError.empty()) {
+            firstError = message;
+        }
+    };
+    std::set<std::string> seen;
+
+    for (size_t i = 0; i < words.size(); ++i) {
+        const std::string& word = words[i];
+        const ParameterSpec* parameter = nullptr;
+        std::string value;
+        bool valueGiven = false;
+
+        if (word.size() > 2 && StartsWith(word, "--")) {
+            size_t equals = word.find('=');
+            std::string name = word.substr(2, equals == std::string::npos ? equals : equals - 2);
+            if (equals != std::string::npos) {
+                value = word.substr(equals + 1);
+                valueGiven = true;
+            }
+            parameter = spec.FindParameter(name).get();
+        } else if (word.size() >= 2 && word[0] == '-' && word[1] != '-') {
+            parameter = FindShort(spec, word.substr(1, 1));
+            if (parameter && word.size() > 2) {
+                value = word.substr(2);
+                valueGiven = true;
+            }
+        } else {
+            fail("unexpected argument " + Quoted(ValidUtf8(word)));
+            continue;
+        }
+
+        if (!parameter) {
+            size_t next = i;
+            std::string error;
+            if (globals && TakeGlobalOption(words, next, *globals, error)) {
+                if (!error.empty()) {
+                    fail(error);
+                }
+                i = next - 1;
+                continue;
+            }
+            std::string option =
+                StartsWith(word, "--") ? word.substr(0, word.find('=')) : word.substr(0, 2);
+            fail("unknown option " + Quoted(ValidUtf8(option)));
+            continue;
+        }
+
+        const std::string& name = parameter->GetName();
+        const std::string option = Quoted("--" + name);
+        if (parameter->GetType() == CallSpec::PARAM_FLAG) {
+            if (valueGiven) {
+                fail("option " + option + " takes no value");
+                continue;
+            }
+        } else if (!valueGiven) {
+            if (i + 1 >= words.size() || LooksLikeLongOption(words[i + 1])) {
+                fail("option " + option +
+                     (parameter->GetType() == CallSpec::PARAM_BOOL ? " needs a value: true or false"
+                                                                   : " needs a value"));
+                continue;
+            }
+            value = words[++i];
+        }
+
+        if (!seen.insert(name).second && parameter->GetType() != CallSpec::PARAM_STRING_LIST) {
+            fail("option " + option + " given more than once");
+            continue;
+        }
+        std::string error = Store(*parameter, value, *result.input);
+        if (!error.empty()) {
+            fail(error);
+        }
+    }
+
+    for (const auto& parameter : spec.GetParameters()) {
+        if (parameter && parameter->IsRequired() && !seen.count(parameter->GetName())) {
+            fail("missing required option " + Quoted("--" + parameter->GetName()));
+        }
+    }
+
+    if (globals && globals->help) {
+        result.helpRequested = true;
+    } else {
+        result.error = firstError;
+    }
+    return result;
+}
+
+}  // namespace App
+}  // namespace AutoCli
+}  // namespace Kalmor

@@ -1,0 +1,211 @@
+// One invocation of autocli: from the words of the command line to texts and an exit status.
+#include "CommandLine.h"
+
+#include <algorithm>
+#include <exception>
+
+#include "ArgumentParser.h"
+#include "CommandTree.h"
+#include "Formatter.h"
+#include "Help.h"
+#include "Text.h"
+
+namespace Kalmor {
+namespace AutoCli {
+namespace App {
+
+namespace {
+
+constexpr char kDefaultFormatter[] = "simple";
+
+// "autocli: " or "autocli: mesk cluster get: " before a message.
+std::string Prefix(const NamespaceNode* node) {
+    std::string path = node ? node->GetPathString(' ') : std::string();
+    return path.empty() ? "autocli: " : "autocli: " + path + ": ";
+}
+
+RunResult UsageError(RunResult result, const NamespaceNode* node, const std::string& message) {
+    result.err += Prefix(node) + message + "\n";
+    result.status = kExitUsage;
+    return result;
+}
+
+// The fields that the command's result can have, from its output description: those of the
+// top-level structure, or of the element template of a list of structures.
+const MetaObj::MetaStruct* ResultStructure(const MetaObj::MetaObject* root) {
+    if (root == nullptr) {
+        return nullptr;
+    }
+    if (root->GetType() == MetaObj::META_STRUCT) {
+        return static_cast<const MetaObj::MetaStruct*>(root);
+    }
+    if (root->GetType() == MetaObj::META_LIST) {
+        const auto& element = static_cast<const MetaObj::MetaList*>(root)->GetTemplate();
+        if (element && element->GetType() == MetaObj::META_STRUCT) {
+            return static_cast<const MetaObj::MetaStruct*>(element.get());
+        }
+    }
+    return nullptr;
+}
+
+// Refuses --fields names that the command's result does not have, before the command runs.
+std::string CheckFields(CommandSpec& command, const std::vector<std::string>& fields) {
+    auto outputSpec = command.GetOutputSpec();
+    const MetaObj::MetaStruct* structure = ResultStructure(outputSpec->GetRootObject().get());
+    if (structure == nullptr) {
+        return std::string();
+    }
+    std::vector<std::string> known;
+    for (const auto& field : structure->GetFields()) {
+        known.push_back(field.name);
+    }
+    for (const auto& name : fields) {
+        if (std::find(known.begin(), known.end(), name) == known.end()) {
+            return "unknown field '" + ValidUtf8(name) +
+                   "' for --fields; valid choices: " + Join(known, ", ");
+        }
+    }
+    return std::string();
+}
+
+RunResult RunCommand(CommandSpec& command, const std::vector<std::string>& words, size_t next,
+                     GlobalOptions globals) {
+    RunResult result;
+    std::shared_ptr<CallSpec::InputSpec> inputSpec = command.GetInputSpec();
+    ParseResult parsed = ParseArguments(
+        std::vector<std::string>(words.begin() + static_cast<std::ptrdiff_t>(next), words.end()),
+        *inputSpec, &globals);
+    if (parsed.helpRequested) {
+        result.out = RenderCommandHelp(command, *inputSpec);
+        return result;
+    }
+    if (!parsed.error.empty()) {
+        return UsageError(result, &command, parsed.error);
+    }
+    if (globals.listCommands) {
+        result.out = ListCommands(command);
+        return result;
+    }
+
+    std::string formatterName = globals.formatter;
+    if (formatterName.empty()) {
+        formatterName = command.GetDefaultOutputFormatter();
+        if (!FindFormatter(formatterName)) {
+            formatterName = kDefaultFormatter;
+        }
+    }
+    FormatterFunction formatter = FindFormatter(formatterName);
+    if (!formatter) {
+        return UsageError(result, nullptr,
+                          "unknown formatter '" + ValidUtf8(formatterName) +
+                              "'; valid choices: " + Join(FormatterNames(), ", "));
+    }
+    if (globals.fieldsGiven) {
+        std::string error = CheckFields(command, globals.fields);
+        if (!error.empty()) {
+            return UsageError(result, &command, error);
+        }
+    }
+
+    std::shared_ptr<CallSpec::CallTarget> target = command.GetDispatcher();
+    if (!target) {
+        result.err = Prefix(&command) + "this command cannot be run\n";
+        result.status = kExitCommandFailed;
+        return result;
+    }
+    auto output = CallSpec::Output::New();
+    target->Execute(parsed.input, output);
+
+    if (const auto& root = output->GetRootObject()) {
+        FormatOptions options;
+        options.outputParameters = command.GetDefaultOutputParameters();
+        options.fieldsGiven = globals.fieldsGiven;
+        options.fields = globals.fields;
+        options.noHeader = globals.noHeader;
+        result.out = formatter(*root, options);
+    }
+    for (const auto& message : output->GetErrorMessages()) {
+        result.err += message + "\n";
+    }
+    if (globals.debug) {
+        result.err +=
+            std::string("output complete: ") + (output->IsComplete() ? "yes" : "no") + "\n";
+    }
+    result.status = output->GetErrorMessages().empty() ? kExitSuccess : kExitCommandFailed;
+    return result;
+}
+
+}  // namespace
+
+RunResult Run(const std::vector<std::string>& words, const std::shared_ptr<NamespaceNode>& root) {
+    RunResult result;
+    GlobalOptions globals;
+    std::shared_ptr<NamespaceNode> node = root;
+    size_t index = 0;
+    // Global options may stand before the path and between its words; the words after a
+    // command are the command's.
+    while (true) {
+        while (index < words.size() && !words[index].empty() && words[index][0] == '-') {
+            std::string error;
+            if (!TakeGlobalOption(words, index, globals, error)) {
+                return UsageError(result, node.get(),
+                                  "unknown option '" + ValidUtf8(words[index]) + "'");
+            }
+            if (!error.empty()) {
+                return UsageError(result, node.get(), error);
+            }
+        }
+        if (index >= words.size()) {
+            break;
+        }
+        PathResolution path = ResolvePath(node, words, index);
+        if (!path.error.empty()) {
+            return UsageError(result, nullptr, path.error);
+        }
+        node = path.node;
+        index = path.next;
+        if (node->GetType() == NodeType::Command) {
+            break;
+        }
+    }
+
+    if (node->GetType() == NodeType::Command) {
+        auto* command = dynamic_cast<CommandSpec*>(node.get());
+        if (command == nullptr) {
+            result.err = Prefix(node.get()) + "this command cannot be run\n";
+            result.status = kExitCommandFailed;
+            return result;
+        }
+        try {
+            return RunCommand(*command, words, index, globals);
+        } catch (const std::exception& e) {
+            result.err = Prefix(node.get()) + "the command failed: " + e.what() + "\n";
+        } catch (...) {
+            result.err = Prefix(node.get()) + "the command failed with an unknown exception\n";
+        }
+        result.status = kExitCommandFailed;
+        return result;
+    }
+
+    if (globals.help) {
+        result.out = RenderNamespaceHelp(*node);
+        return result;
+    }
+    if (globals.listCommands) {
+        result.out = ListCommands(*node);
+        return result;
+    }
+    result.out = RenderNamespaceHelp(*node);
+    if (node->GetNamespaceNodes().empty()) {
+        return UsageError(result, node.get(),
+                          "no commands are registered; check the plug-in directories "
+                          "(AUTOCLI_PLUGIN_PATH)");
+    }
+    return UsageError(
+        result, node.get(),
+        "missing command; valid choices: " + Join(node->GetNamespaceNodeNames(), ", "));
+}
+
+}  // namespace App
+}  // namespace AutoCli
+}  // namespace Kalmor

@@ -1,0 +1,70 @@
+// The "csv" formatter: a header row of field names and one row per structure.
+#include "Formatter.h"
+
+namespace Kalmor {
+namespace AutoCli {
+namespace App {
+
+namespace {
+
+// Quotes a cell when it holds a comma, a quotation mark or a line break, doubling the
+// quotation marks inside.
+std::string Cell(const std::string& value) {
+    if (value.find_first_of(",\"\r\n") == std::string::npos) {
+        return value;
+    }
+    std::string quoted = "\"";
+    for (char c : value) {
+        quoted += c;
+        if (c == '"') {
+            quoted += '"';
+        }
+    }
+    return quoted + "\"";
+}
+
+void AppendRow(std::string& text, const std::vector<std::string>& cells) {
+    for (size_t i = 0; i < cells.size(); ++i) {
+        if (i != 0) {
+            text += ',';
+        }
+        text += Cell(cells[i]);
+    }
+    text += '\n';
+}
+
+}  // namespace
+
+std::string FormatCsv(const MetaObj::MetaObject& root, const FormatOptions& options) {
+    OutputLayout layout(options);
+    Grid grid;
+    if (!BuildGrid(root, layout, false, grid)) {
+        // Texts, integers and booleans: one column named "value".
+        grid.columns = {"value"};
+        if (root.GetType() == MetaObj::META_LIST) {
+            for (const auto& element : static_cast<const MetaObj::MetaList&>(root).GetElements()) {
+                grid.rows.push_back({ValueText(element.get())});
+            }
+        } else {
+            std::string value = ValueText(&root);
+            if (!value.empty()) {
+                grid.rows.push_back({value});
+            }
+        }
+    }
+    if (grid.columns.empty()) {
+        return std::string();
+    }
+    std::string text;
+    if (!options.noHeader) {
+        AppendRow(text, grid.columns);
+    }
+    for (const auto& row : grid.rows) {
+        AppendRow(text, row);
+    }
+    return text;
+}
+
+}  // namespace App
+}  // namespace AutoCli
+}  // namespace Kalmor

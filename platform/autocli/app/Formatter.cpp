@@ -1,0 +1,251 @@
+// What the formatters share: output parameters, value texts, and the formatters by name.
+#include "Formatter.h"
+
+#include <nlohmann/json.hpp>
+
+#include "Text.h"
+
+namespace Kalmor {
+namespace AutoCli {
+namespace App {
+
+using MetaObj::MetaObject;
+using MetaObj::MetaStruct;
+
+namespace {
+
+constexpr char kHeaderPrefix[] = "header:";
+constexpr char kFieldsPrefix[] = "fields:";
+constexpr char kUnitsPrefix[] = "units:";
+
+// The rest of `key` after `prefix` in `rest`, when the key starts with it.
+bool AfterPrefix(const std::string& key, const char* prefix, std::string& rest) {
+    size_t length = std::char_traits<char>::length(prefix);
+    if (key.compare(0, length, prefix) != 0) {
+        return false;
+    }
+    rest = key.substr(length);
+    return true;
+}
+
+bool HasField(const MetaStruct& structure, const std::string& name) {
+    for (const auto& field : structure.GetFields()) {
+        if (field.name == name) {
+            return true;
+        }
+    }
+    return false;
+}
+
+struct NamedFormatter {
+    const char* name;
+    FormatterFunction function;
+};
+
+const NamedFormatter kFormatters[] = {
+    {"simple", FormatSimple},          {"table", FormatTable}, {"json", FormatJson},
+    {"json-pretty", FormatJsonPretty}, {"xml", FormatXml},     {"csv", FormatCsv},
+};
+
+}  // namespace
+
+OutputLayout::OutputLayout(const FormatOptions& options) : options_(options) {
+    for (const auto& parameter : options.outputParameters) {
+        std::string name;
+        if (AfterPrefix(parameter.first, kHeaderPrefix, name)) {
+            titles_[name] = parameter.second;
+        } else if (AfterPrefix(parameter.first, kFieldsPrefix, name)) {
+            fields_[name] = SplitNames(parameter.second);
+        } else if (AfterPrefix(parameter.first, kUnitsPrefix, name)) {
+            units_[name] = parameter.second;
+        }
+    }
+}
+
+std::string OutputLayout::Title(const MetaStruct& structure) const {
+    auto found = titles_.find(structure.GetName());
+    if (found == titles_.end()) {
+        return std::string();
+    }
+    const std::string& pattern = found->second;
+    std::string title;
+    size_t pos = 0;
+    while (pos < pattern.size()) {
+        size_t open = pattern.find('%', pos);
+        size_t close = open == std::string::npos ? open : pattern.find('%', open + 1);
+        if (close == std::string::npos) {
+            title.append(pattern, pos, std::string::npos);
+            break;
+        }
+        title.append(pattern, pos, open - pos);
+        const std::string name = pattern.substr(open + 1, close - open - 1);
+        if (HasField(structure, name)) {
+            title += ValueText(structure.GetField(name).get());
+            pos = close + 1;
+            continue;
+        }
+        // Not a field: keep the first percent sign and look again from the second.
+        title += '%';
+        pos = open + 1;
+    }
+    return title;
+}
+
+bool OutputLayout::HasTitle(const std::string& structName) const {
+    return titles_.count(structName) != 0;
+}
+
+std::string OutputLayout::RawTitle(const std::string& structName) const {
+    auto found = titles_.find(structName);
+    return found == titles_.end() ? std::string() : found->second;
+}
+
+bool OutputLayout::TitleNamesFields(const std::string& structName) const {
+    auto found = titles_.find(structName);
+    return found != titles_.end() && found->second.find('%') != std::string::npos;
+}
+
+std::vector<const MetaStruct::Field*> OutputLayout::Fields(const MetaStruct& structure,
+                                                           bool topLevel) const {
+    const std::vector<std::string>* names = nullptr;
+    if (topLevel && options_.fieldsGiven) {
+        names = &options_.fields;
+    } else {
+        auto found = fields_.find(structure.GetName());
+        if (found != fields_.end()) {
+            names = &found->second;
+        }
+    }
+    std::vector<const MetaStruct::Field*> shown;
+    if (names == nullptr) {
+        for (const auto& field : structure.GetFields()) {
+            shown.push_back(&field);
+        }
+        return shown;
+    }
+    for (const auto& name : *names) {
+        for (const auto& field : structure.GetFields()) {
+            if (field.name == name) {
+                shown.push_back(&field);
+                break;
+            }
+        }
+    }
+    return shown;
+}
+
+std::string OutputLayout::Unit(const std::string& structName, const std::string& field) const {
+    auto found = units_.find(structName + "." + field);
+    return found == units_.end() ? std::string() : found->second;
+}
+
+std::string ValueText(const MetaObject* value, const std::string& unit) {
+    std::string text;
+    if (value == nullptr) {
+        return text;
+    }
+    switch (value->GetType()) {
+        case MetaObj::META_STRING: {
+            const auto& scalar = static_cast<const MetaObj::MetaString&>(*value);
+            text = scalar.HasValue() ? scalar.GetValue() : std::string();
+            break;
+        }
+        case MetaObj::META_INT: {
+            const auto& scalar = static_cast<const MetaObj::MetaInt&>(*value);
+            text = scalar.HasValue() ? std::to_string(scalar.GetValue()) : std::string();
+            break;
+        }
+        case MetaObj::META_BOOL: {
+            const auto& scalar = static_cast<const MetaObj::MetaBool&>(*value);
+            text = scalar.HasValue() ? (scalar.GetValue() ? "true" : "false") : "";
+            break;
+        }
+        case MetaObj::META_LIST: {
+            const auto& list = static_cast<const MetaObj::MetaList&>(*value);
+            if (list.GetElementType() != MetaObj::META_STRUCT) {
+                std::vector<std::string> items;
+                for (const auto& element : list.GetElements()) {
+                    items.push_back(ValueText(element.get()));
+                }
+                text = Join(items, ", ");
+                break;
+            }
+            text = ToJson(value).dump(-1, ' ', false, nlohmann::json::error_handler_t::replace);
+            break;
+        }
+        case MetaObj::META_STRUCT:
+            text = ToJson(value).dump(-1, ' ', false, nlohmann::json::error_handler_t::replace);
+            break;
+    }
+    if (!text.empty() && !unit.empty()) {
+        text += " " + unit;
+    }
+    return text;
+}
+
+bool BuildGrid(const MetaObject& root, const OutputLayout& layout, bool withUnits, Grid& grid) {
+    std::vector<const MetaStruct*> elements;
+    const MetaStruct* model = nullptr;
+    if (root.GetType() == MetaObj::META_STRUCT) {
+        model = static_cast<const MetaStruct*>(&root);
+        elements.push_back(model);
+    } else if (root.GetType() == MetaObj::META_LIST &&
+               static_cast<const MetaObj::MetaList&>(root).GetElementType() ==
+                   MetaObj::META_STRUCT) {
+        const auto& list = static_cast<const MetaObj::MetaList&>(root);
+        for (const auto& element : list.GetElements()) {
+            if (element && element->GetType() == MetaObj::META_STRUCT) {
+                elements.push_back(static_cast<const MetaStruct*>(element.get()));
+            }
+        }
+        if (!elements.empty()) {
+            model = elements.front();
+        } else if (list.GetTemplate() && list.GetTemplate()->GetType() == MetaObj::META_STRUCT) {
+            model = static_cast<const MetaStruct*>(list.GetTemplate().get());
+        }
+    } else {
+        return false;
+    }
+
+    grid = Grid();
+    if (model == nullptr) {
+        return true;
+    }
+    grid.structName = model->GetName();
+    for (const auto* field : layout.Fields(*model, true)) {
+        grid.columns.push_back(field->name);
+    }
+    for (const auto* element : elements) {
+        std::vector<std::string> row;
+        for (const auto& column : grid.columns) {
+            std::string unit = withUnits ? layout.Unit(element->GetName(), column) : "";
+            row.push_back(ValueText(element->GetField(column).get(), unit));
+        }
+        grid.rows.push_back(std::move(row));
+    }
+    return true;
+}
+
+FormatterFunction FindFormatter(const std::string& name) {
+    for (const auto& formatter : kFormatters) {
+        if (name == formatter.name) {
+            return formatter.function;
+        }
+    }
+    return nullptr;
+}
+
+const std::vector<std::string>& FormatterNames() {
+    static const std::vector<std::string> names = [] {
+        std::vector<std::string> list;
+        for (const auto& formatter : kFormatters) {
+            list.push_back(formatter.name);
+        }
+        return list;
+    }();
+    return names;
+}
+
+}  // namespace App
+}  // namespace AutoCli
+}  // namespace Kalmor

@@ -1,0 +1,102 @@
+// Formatters: a command's result as text for administrators and scripts.
+#pragma once
+
+#include <map>
+#include <string>
+#include <utility>
+#include <vector>
+
+#include <nlohmann/json_fwd.hpp>
+
+#include "autocli/MetaObj.h"
+
+namespace Kalmor {
+namespace AutoCli {
+namespace App {
+
+// What shapes a result besides the result itself.
+struct FormatOptions {
+    // The command's default output parameters ("header:", "fields:" and "units:" keys).
+    std::vector<std::pair<std::string, std::string>> outputParameters;
+    // --fields: the fields to show of each top-level structure, in this order.
+    bool fieldsGiven = false;
+    std::vector<std::string> fields;
+    // --no-header: no header row in table and csv output.
+    bool noHeader = false;
+};
+
+// The command's "header:", "fields:" and "units:" parameters, looked up by structure name.
+class OutputLayout {
+  public:
+    explicit OutputLayout(const FormatOptions& options);
+
+    // The title of a structure: its "header:" text with every "%Field%" replaced by that
+    // field's value; empty when it has none.
+    std::string Title(const MetaObj::MetaStruct& structure) const;
+    // Whether the structure has a "header:" parameter at all.
+    bool HasTitle(const std::string& structName) const;
+    // The "header:" text as the command gave it, or empty.
+    std::string RawTitle(const std::string& structName) const;
+    // Whether the structure's title names one of its fields, so that it differs per element.
+    bool TitleNamesFields(const std::string& structName) const;
+    // The fields to show, in display order: --fields for a top-level structure when given,
+    // else the "fields:" list, else every field in declared order. Names the structure does
+    // not have are left out.
+    std::vector<const MetaObj::MetaStruct::Field*> Fields(const MetaObj::MetaStruct& structure,
+                                                          bool topLevel) const;
+    // The unit label of a field, or empty.
+    std::string Unit(const std::string& structName, const std::string& field) const;
+
+  private:
+    const FormatOptions& options_;
+    std::map<std::string, std::string> titles_;
+    std::map<std::string, std::vector<std::string>> fields_;
+    std::map<std::string, std::string> units_;  // key: "<StructName>.<Field>"
+};
+
+// The text of a scalar (empty when it has no value), of a list of texts joined by ", ", and
+// of anything else as compact JSON; followed by the unit, if any, when there is a value.
+std::string ValueText(const MetaObj::MetaObject* value, const std::string& unit = std::string());
+
+// A structure or a list of structures as rows of cells under named columns: a structure
+// is one row, a list one row per element. The columns are the fields shown of the first
+// element (or of the list's template when the list is empty).
+struct Grid {
+    std::string structName;
+    std::vector<std::string> columns;
+    std::vector<std::vector<std::string>> rows;
+};
+
+// Fills `grid` from a structure or a list of structures and returns true; returns false for
+// any other result. Cells carry unit labels when `withUnits` is set.
+bool BuildGrid(const MetaObj::MetaObject& root, const OutputLayout& layout, bool withUnits,
+               Grid& grid);
+
+// A result that is not a structure or a list of structures, as "simple" and "table" print
+// it: a text or integer on one line, a list of texts one per line, and a boolean as nothing
+// for true and "false" for false (scripts test the exit status; a bare "true" would only
+// clutter the terminal).
+std::string PlainText(const MetaObj::MetaObject& root);
+
+// The result as JSON: structures as objects with fields in declared order, lists as arrays,
+// empty scalars as null.
+nlohmann::ordered_json ToJson(const MetaObj::MetaObject* value);
+
+using FormatterFunction = std::string (*)(const MetaObj::MetaObject& root,
+                                          const FormatOptions& options);
+
+std::string FormatSimple(const MetaObj::MetaObject& root, const FormatOptions& options);
+std::string FormatTable(const MetaObj::MetaObject& root, const FormatOptions& options);
+std::string FormatJson(const MetaObj::MetaObject& root, const FormatOptions& options);
+std::string FormatJsonPretty(const MetaObj::MetaObject& root, const FormatOptions& options);
+std::string FormatXml(const MetaObj::MetaObject& root, const FormatOptions& options);
+std::string FormatCsv(const MetaObj::MetaObject& root, const FormatOptions& options);
+
+// The formatter of that name, or nullptr.
+FormatterFunction FindFormatter(const std::string& name);
+// The formatter names, in the order help lists them.
+const std::vector<std::string>& FormatterNames();
+
+}  // namespace App
+}  // namespace AutoCli
+}  // namespace Kalmor

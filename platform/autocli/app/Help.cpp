@@ -1,0 +1,160 @@
+// Help texts of namespaces and commands.
+#include "Help.h"
+
+#include <algorithm>
+#include <vector>
+
+#include "Formatter.h"
+#include "Text.h"
+
+namespace Kalmor {
+namespace AutoCli {
+namespace App {
+
+using CallSpec::ParameterSpec;
+
+namespace {
+
+struct Row {
+    std::string left;
+    std::string right;
+};
+
+// Rows as two aligned columns, indented by two blanks.
+std::string RenderRows(const std::vector<Row>& rows) {
+    size_t width = 0;
+    for (const auto& row : rows) {
+        width = std::max(width, DisplayWidth(row.left));
+    }
+    std::string text;
+    for (const auto& row : rows) {
+        std::string line = "  " + PadRight(row.left, width + 2) + row.right;
+        text += line.substr(0, line.find_last_not_of(' ') + 1) + "\n";
+    }
+    return text;
+}
+
+std::string ValuePlaceholder(const ParameterSpec& parameter) {
+    switch (parameter.GetType()) {
+        case CallSpec::PARAM_STRING:
+            return " <text>";
+        case CallSpec::PARAM_INT:
+            return " <integer>";
+        case CallSpec::PARAM_BOOL:
+            return " <boolean>";
+        case CallSpec::PARAM_FLAG:
+            return std::string();
+        case CallSpec::PARAM_STRING_LIST:
+            return " <text>...";
+    }
+    return " <value>";
+}
+
+std::string RangeText(int64_t minimum, int64_t maximum) {
+    // "0-512" reads well; with a negative bound the dash would be ambiguous.
+    const char* separator = minimum < 0 || maximum < 0 ? " to " : "-";
+    return std::to_string(minimum) + separator + std::to_string(maximum);
+}
+
+void AppendParagraph(std::string& text, const std::string& paragraph) {
+    if (!paragraph.empty()) {
+        text += "\n" + paragraph + "\n";
+    }
+}
+
+}  // namespace
+
+std::string ExpandEnum(const ParameterSpec& parameter) {
+    static const std::string kPlaceholder = "%ENUM%";
+    std::string text = parameter.GetDescription();
+    const auto& constraint = parameter.GetConstraint();
+    if (!constraint) {
+        return text;
+    }
+    std::string allowed;
+    if (constraint->GetType() == CallSpec::CONSTRAINT_STRING_ENUM) {
+        std::vector<std::string> values;
+        for (const auto& entry : constraint->GetStringEnum()) {
+            values.push_back(entry.value);
+        }
+        allowed = Join(values, ", ");
+    } else if (constraint->GetType() == CallSpec::CONSTRAINT_INT_RANGE) {
+        allowed = RangeText(constraint->GetIntMinimum(), constraint->GetIntMaximum());
+    } else {
+        return text;
+    }
+    for (size_t pos = text.find(kPlaceholder); pos != std::string::npos;
+         pos = text.find(kPlaceholder, pos + allowed.size())) {
+        text.replace(pos, kPlaceholder.size(), allowed);
+    }
+    return text;
+}
+
+std::string RenderNamespaceHelp(const NamespaceNode& node) {
+    const std::string path = node.GetPathString(' ');
+    const bool isRoot = path.empty();
+    bool hasNamespaces = false;
+    for (const auto& child : node.GetNamespaceNodes()) {
+        hasNamespaces = hasNamespaces || child->GetType() == NodeType::Namespace;
+    }
+    std::string text = "Usage: autocli [options] " + (isRoot ? std::string() : path + " ") +
+                       (hasNamespaces ? "<namespace>... <command>" : "<command>") +
+                       " [command options]\n";
+    AppendParagraph(text, node.GetDescription());
+
+    std::vector<Row> children;
+    for (const auto& child : node.GetNamespaceNodes()) {
+        children.push_back(Row{child->GetName(), child->GetDescription()});
+    }
+    if (children.empty()) {
+        text += "\nNo namespaces or commands are registered here.\n";
+    } else {
+        text += "\nAvailable namespaces and commands:\n" + RenderRows(children);
+    }
+
+    if (isRoot) {
+        text += "\nOptions:\n" +
+                RenderRows({
+                    {"--formatter NAME", "Output format: " + Join(FormatterNames(), ", ")},
+                    {"--fields A,B", "Show only these fields (simple, table and csv)"},
+                    {"--no-header", "Leave out the header row of table and csv output"},
+                    {"--list-commands", "Print every command path, one per line"},
+                    {"--debug", "Report on stderr whether the command completed its output"},
+                    {"-h, --help", "Show the help of a namespace or command"},
+                });
+        text +=
+            "\nThe options other than --help and --list-commands may also follow a command\n"
+            "that has no option of the same name. Set AUTOCLI_PLUGIN_PATH (directories\n"
+            "separated by colons) to load plug-ins from other directories.\n";
+    }
+    return text;
+}
+
+std::string RenderCommandHelp(const CommandSpec& command, const CallSpec::InputSpec& spec) {
+    std::vector<Row> rows;
+    for (const auto& parameter : spec.GetParameters()) {
+        if (!parameter) {
+            continue;
+        }
+        std::string left =
+            parameter->GetShortName().empty() ? "    " : "-" + parameter->GetShortName() + ", ";
+        left += "--" + parameter->GetName() + ValuePlaceholder(*parameter);
+        std::string right = ExpandEnum(*parameter);
+        if (parameter->IsRequired()) {
+            right += right.empty() ? "(required)" : " (required)";
+        }
+        rows.push_back(Row{left, right});
+    }
+
+    std::string text = "Usage: autocli [options] " + command.GetPathString(' ') +
+                       (rows.empty() ? "\n" : " [command options]\n");
+    AppendParagraph(text, command.GetDescription());
+    if (!rows.empty()) {
+        text += "\nCommand options:\n" + RenderRows(rows);
+    }
+    return text;
+}
+
+}  // namespace App
+}  // namespace AutoCli
+}  // namespace Kalmor

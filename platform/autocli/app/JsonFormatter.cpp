@@ -1,0 +1,68 @@
+// The "json" and "json-pretty" formatters.
+#include <nlohmann/json.hpp>
+
+#include "Formatter.h"
+
+namespace Kalmor {
+namespace AutoCli {
+namespace App {
+
+using MetaObj::MetaObject;
+
+nlohmann::ordered_json ToJson(const MetaObject* value) {
+    if (value == nullptr) {
+        return nullptr;
+    }
+    switch (value->GetType()) {
+        case MetaObj::META_STRING: {
+            const auto& scalar = static_cast<const MetaObj::MetaString&>(*value);
+            return scalar.HasValue() ? nlohmann::ordered_json(scalar.GetValue()) : nullptr;
+        }
+        case MetaObj::META_INT: {
+            const auto& scalar = static_cast<const MetaObj::MetaInt&>(*value);
+            return scalar.HasValue() ? nlohmann::ordered_json(scalar.GetValue()) : nullptr;
+        }
+        case MetaObj::META_BOOL: {
+            const auto& scalar = static_cast<const MetaObj::MetaBool&>(*value);
+            return scalar.HasValue() ? nlohmann::ordered_json(scalar.GetValue()) : nullptr;
+        }
+        case MetaObj::META_STRUCT: {
+            nlohmann::ordered_json object = nlohmann::ordered_json::object();
+            for (const auto& field : static_cast<const MetaObj::MetaStruct&>(*value).GetFields()) {
+                object[field.name] = ToJson(field.value.get());
+            }
+            return object;
+        }
+        case MetaObj::META_LIST: {
+            nlohmann::ordered_json array = nlohmann::ordered_json::array();
+            for (const auto& element :
+                 static_cast<const MetaObj::MetaList&>(*value).GetElements()) {
+                array.push_back(ToJson(element.get()));
+            }
+            return array;
+        }
+    }
+    return nullptr;
+}
+
+namespace {
+
+// Texts from the host are not guaranteed to be UTF-8; a bad byte becomes U+FFFD instead of
+// an exception.
+std::string Dump(const MetaObject& root, int indent) {
+    return ToJson(&root).dump(indent, ' ', false, nlohmann::json::error_handler_t::replace) + "\n";
+}
+
+}  // namespace
+
+std::string FormatJson(const MetaObject& root, const FormatOptions& /*options*/) {
+    return Dump(root, -1);
+}
+
+std::string FormatJsonPretty(const MetaObject& root, const FormatOptions& /*options*/) {
+    return Dump(root, 2);
+}
+
+}  // namespace App
+}  // namespace AutoCli
+}  // namespace Kalmor

@@ -1,0 +1,71 @@
+// The "table" formatter: aligned columns under a header row and a rule.
+#include <algorithm>
+
+#include "Formatter.h"
+#include "Text.h"
+
+namespace Kalmor {
+namespace AutoCli {
+namespace App {
+
+namespace {
+
+constexpr char kColumnGap[] = "  ";
+
+void AppendRow(std::string& text, const std::vector<std::string>& cells,
+               const std::vector<size_t>& widths) {
+    std::string line;
+    for (size_t i = 0; i < cells.size(); ++i) {
+        if (i != 0) {
+            line += kColumnGap;
+        }
+        line += i + 1 == cells.size() ? cells[i] : PadRight(cells[i], widths[i]);
+    }
+    size_t end = line.find_last_not_of(' ');
+    text += (end == std::string::npos ? std::string() : line.substr(0, end + 1)) + "\n";
+}
+
+}  // namespace
+
+std::string FormatTable(const MetaObj::MetaObject& root, const FormatOptions& options) {
+    OutputLayout layout(options);
+    Grid grid;
+    if (!BuildGrid(root, layout, true, grid)) {
+        return PlainText(root);
+    }
+    if (grid.columns.empty()) {
+        return std::string();
+    }
+
+    std::vector<size_t> widths;
+    for (const auto& column : grid.columns) {
+        widths.push_back(DisplayWidth(column));
+    }
+    for (const auto& row : grid.rows) {
+        for (size_t i = 0; i < row.size(); ++i) {
+            widths[i] = std::max(widths[i], DisplayWidth(row[i]));
+        }
+    }
+
+    std::string text;
+    if (!options.noHeader) {
+        // A title that names a field differs per row: the column says it already.
+        if (layout.HasTitle(grid.structName) && !layout.TitleNamesFields(grid.structName)) {
+            text += layout.RawTitle(grid.structName) + "\n";
+        }
+        AppendRow(text, grid.columns, widths);
+        std::vector<std::string> rule;
+        for (size_t width : widths) {
+            rule.push_back(std::string(width, '-'));
+        }
+        AppendRow(text, rule, widths);
+    }
+    for (const auto& row : grid.rows) {
+        AppendRow(text, row, widths);
+    }
+    return text;
+}
+
+}  // namespace App
+}  // namespace AutoCli
+}  // namespace Kalmor

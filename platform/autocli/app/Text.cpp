@@ -1,0 +1,137 @@
+// Small text helpers shared by the parser, the help and the formatters.
+#include "Text.h"
+
+namespace Kalmor {
+namespace AutoCli {
+namespace App {
+
+namespace {
+
+// Decodes one well-formed UTF-8 sequence at text[pos]: returns its length and stores the code
+// point, or returns 0 for a malformed, overlong, surrogate or out-of-range sequence.
+size_t DecodeOne(const std::string& text, size_t pos, char32_t& codePoint) {
+    const auto byte = [&](size_t i) { return static_cast<unsigned char>(text[pos + i]); };
+    unsigned char lead = byte(0);
+    size_t length;
+    char32_t minimum;
+    if (lead < 0x80) {
+        codePoint = lead;
+        return 1;
+    } else if (lead >= 0xC2 && lead <= 0xDF) {
+        length = 2;
+        minimum = 0x80;
+        codePoint = lead & 0x1F;
+    } else if (lead >= 0xE0 && lead <= 0xEF) {
+        length = 3;
+        minimum = 0x800;
+        codePoint = lead & 0x0F;
+    } else if (lead >= 0xF0 && lead <= 0xF4) {
+        length = 4;
+        minimum = 0x10000;
+        codePoint = lead & 0x07;
+    } else {
+        return 0;
+    }
+    if (pos + length > text.size()) {
+        return 0;
+    }
+    for (size_t i = 1; i < length; ++i) {
+        if ((byte(i) & 0xC0) != 0x80) {
+            return 0;
+        }
+        codePoint = (codePoint << 6) | (byte(i) & 0x3F);
+    }
+    if (codePoint < minimum || codePoint > 0x10FFFF ||
+        (codePoint >= 0xD800 && codePoint <= 0xDFFF)) {
+        return 0;
+    }
+    return length;
+}
+
+bool AllowedInXml(char32_t c) {
+    if (c < 0x20) {
+        return c == 0x09 || c == 0x0A || c == 0x0D;
+    }
+    return c != 0xFFFE && c != 0xFFFF;
+}
+
+}  // namespace
+
+std::string Trim(const std::string& text) {
+    size_t begin = text.find_first_not_of(" \t");
+    if (begin == std::string::npos) {
+        return std::string();
+    }
+    size_t end = text.find_last_not_of(" \t");
+    return text.substr(begin, end - begin + 1);
+}
+
+std::vector<std::string> SplitNames(const std::string& text) {
+    std::vector<std::string> names;
+    size_t start = 0;
+    while (start <= text.size()) {
+        size_t comma = text.find(',', start);
+        if (comma == std::string::npos) {
+            comma = text.size();
+        }
+        std::string name = Trim(text.substr(start, comma - start));
+        if (!name.empty()) {
+            names.push_back(name);
+        }
+        start = comma + 1;
+    }
+    return names;
+}
+
+std::string Join(const std::vector<std::string>& items, const std::string& separator) {
+    std::string joined;
+    for (size_t i = 0; i < items.size(); ++i) {
+        if (i != 0) {
+            joined += separator;
+        }
+        joined += items[i];
+    }
+    return joined;
+}
+
+size_t DisplayWidth(const std::string& text) {
+    size_t width = 0;
+    size_t pos = 0;
+    while (pos < text.size()) {
+        char32_t codePoint;
+        size_t length = DecodeOne(text, pos, codePoint);
+        pos += length == 0 ? 1 : length;
+        ++width;
+    }
+    return width;
+}
+
+std::string ValidUtf8(const std::string& text, bool forXml) {
+    static const char kReplacement[] = "\xEF\xBF\xBD";
+    std::string clean;
+    clean.reserve(text.size());
+    size_t pos = 0;
+    while (pos < text.size()) {
+        char32_t codePoint;
+        size_t length = DecodeOne(text, pos, codePoint);
+        if (length == 0) {
+            clean += kReplacement;
+            ++pos;
+            continue;
+        }
+        if (!forXml || AllowedInXml(codePoint)) {
+            clean.append(text, pos, length);
+        }
+        pos += length;
+    }
+    return clean;
+}
+
+std::string PadRight(const std::string& text, size_t width) {
+    size_t current = DisplayWidth(text);
+    return current >= width ? text : text + std::string(width - current, ' ');
+}
+
+}  // namespace App
+}  // namespace AutoCli
+}  // namespace Kalmor

@@ -1,0 +1,148 @@
+// The "xml" formatter: a small, stable document that any XML parser reads.
+//
+//   <?xml version="1.0" encoding="UTF-8"?>
+//   <output>
+//     <structure name="MeskClusterGet">
+//       <field name="Enabled"><boolean>true</boolean></field>
+//       <field name="Sub-Cluster Member UUIDs">
+//         <list type="string">
+//           <string>52f1c2a0-...</string>
+//         </list>
+//       </field>
+//     </structure>
+//   </output>
+//
+// Scalars without a value are empty elements (<string/>). Every field is shown, in declared
+// order, as in the JSON output.
+#include "Formatter.h"
+#include "Text.h"
+
+namespace Kalmor {
+namespace AutoCli {
+namespace App {
+
+using MetaObj::MetaObject;
+
+namespace {
+
+constexpr size_t kIndentStep = 2;
+
+// Escapes markup characters and leaves out what XML 1.0 cannot carry at all, so that the
+// document stays well-formed whatever the host reported.
+std::string Escape(const std::string& raw) {
+    std::string text;
+    for (char c : ValidUtf8(raw, true)) {
+        switch (c) {
+            case '&':
+                text += "&amp;";
+                break;
+            case '<':
+                text += "&lt;";
+                break;
+            case '>':
+                text += "&gt;";
+                break;
+            case '"':
+                text += "&quot;";
+                break;
+            case '\r':
+                text += "&#13;";
+                break;
+            default:
+                text += c;
+        }
+    }
+    return text;
+}
+
+const char* ElementName(MetaObj::MetaType type) {
+    switch (type) {
+        case MetaObj::META_BOOL:
+            return "boolean";
+        case MetaObj::META_INT:
+            return "integer";
+        case MetaObj::META_STRING:
+            return "string";
+        case MetaObj::META_STRUCT:
+            return "structure";
+        case MetaObj::META_LIST:
+            return "list";
+    }
+    return "value";
+}
+
+bool IsScalar(const MetaObject* value) {
+    return value == nullptr ||
+           (value->GetType() != MetaObj::META_STRUCT && value->GetType() != MetaObj::META_LIST);
+}
+
+// A scalar on one line: <integer>42</integer>, or <string/> without a value. A missing value
+// (a null field) is written as an empty string.
+std::string Scalar(const MetaObject* value) {
+    const char* name = value ? ElementName(value->GetType()) : "string";
+    std::string text = ValueText(value);
+    bool hasValue = value != nullptr && !text.empty();
+    if (value && value->GetType() == MetaObj::META_STRING) {
+        hasValue = static_cast<const MetaObj::MetaString*>(value)->HasValue();
+    }
+    if (!hasValue) {
+        return std::string("<") + name + "/>";
+    }
+    return std::string("<") + name + ">" + Escape(text) + "</" + name + ">";
+}
+
+void AppendValue(std::string& text, const MetaObject* value, size_t indent);
+
+void AppendLine(std::string& text, size_t indent, const std::string& line) {
+    text.append(indent, ' ');
+    text += line;
+    text += '\n';
+}
+
+void AppendValue(std::string& text, const MetaObject* value, size_t indent) {
+    if (IsScalar(value)) {
+        AppendLine(text, indent, Scalar(value));
+        return;
+    }
+    if (value->GetType() == MetaObj::META_STRUCT) {
+        const auto& structure = static_cast<const MetaObj::MetaStruct&>(*value);
+        AppendLine(text, indent, "<structure name=\"" + Escape(structure.GetName()) + "\">");
+        for (const auto& field : structure.GetFields()) {
+            std::string open = "<field name=\"" + Escape(field.name) + "\">";
+            if (IsScalar(field.value.get())) {
+                AppendLine(text, indent + kIndentStep,
+                           open + Scalar(field.value.get()) + "</field>");
+            } else {
+                AppendLine(text, indent + kIndentStep, open);
+                AppendValue(text, field.value.get(), indent + 2 * kIndentStep);
+                AppendLine(text, indent + kIndentStep, "</field>");
+            }
+        }
+        AppendLine(text, indent, "</structure>");
+        return;
+    }
+    const auto& list = static_cast<const MetaObj::MetaList&>(*value);
+    std::string open = std::string("<list type=\"") + ElementName(list.GetElementType()) + "\"";
+    if (list.GetElements().empty()) {
+        AppendLine(text, indent, open + "/>");
+        return;
+    }
+    AppendLine(text, indent, open + ">");
+    for (const auto& element : list.GetElements()) {
+        AppendValue(text, element.get(), indent + kIndentStep);
+    }
+    AppendLine(text, indent, "</list>");
+}
+
+}  // namespace
+
+std::string FormatXml(const MetaObject& root, const FormatOptions& /*options*/) {
+    std::string text = "<?xml version=\"1.0\" encoding=\"UTF-8\"?>\n<output>\n";
+    AppendValue(text, &root, kIndentStep);
+    text += "</output>\n";
+    return text;
+}
+
+}  // namespace App
+}  // namespace AutoCli
+}  // namespace Kalmor
