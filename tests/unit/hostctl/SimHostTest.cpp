@@ -302,8 +302,8 @@ TEST_F(SimHost, UnicastAgentsAreKeptAsEntries) {
 
 TEST_F(SimHost, SettingsPoliciesAndResync) {
     EXPECT_EQ(Info().GetDatastoreName(), "meskDatastore");
-    Info().SetDatastoreName("vsanDs2");
-    EXPECT_EQ(Info().GetDatastoreName(), "vsanDs2");
+    Info().SetDatastoreName("clusterStore2");
+    EXPECT_EQ(Info().GetDatastoreName(), "clusterStore2");
     ExpectRefusal("cannot be empty", [&] { Info().SetDatastoreName(""); });
 
     Info().SetFaultDomainName("rack-1");
