@@ -1,6 +1,7 @@
 // What the simulated host does with each operation: the state it keeps coherent, and the
 // refusals that leave it unchanged.
 #include <algorithm>
+#include <functional>
 
 #include "SimFixture.h"
 #include "hostctl/MeskUtil.h"

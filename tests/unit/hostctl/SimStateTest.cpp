@@ -4,7 +4,7 @@
 #include <sys/wait.h>
 #include <unistd.h>
 
-#include <fstream>
+#include <functional>
 
 #include "HostRoot.h"
 #include "SimFixture.h"
