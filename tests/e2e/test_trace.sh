@@ -88,17 +88,17 @@ sim calls
 expect_out_lacks "restart"
 sim service mesktraced running
 
-case_ "a service script that cannot be run"
-sim fail MeskExec "Cannot run mesktraced."
+case_ "a failing status check: get reports it, set keeps the new file"
+sim service mesktraced status-fails
 run mesk trace get
 expect_rc 1
-expect_err "Cannot run mesktraced.$SYSLOG_HINT"
+expect_err "Checking mesktraced status failed.$SYSLOG_HINT"
 run mesk trace set -f 6
 expect_rc 1
-expect_err "Cannot run mesktraced. Refer /var/log/syslog.log for details."
+expect_err "Failed to check mesktraced status. Refer /var/log/syslog.log for details."
 expect_eq "$(cat "$CONF")" "# mesktraced settings
-MESKTRACED_ROTATE_MAX_FILES=6" "file stays rewritten after a service failure"
-sim fail --clear
+MESKTRACED_ROTATE_MAX_FILES=6" "file after a failed status check"
+sim service mesktraced running
 
 case_ "restarts that fail twice: set waits and succeeds on the third"
 sim service mesktraced restart-fails 2
@@ -108,6 +108,9 @@ run mesk trace set -s 10
 expect_rc 0
 expect_err ""
 if [ $((SECONDS - started)) -ge 10 ]; then _pass; else _fail "set returned before two waits"; fi
+sim calls
+expect_eq "$(grep -c '"args":\["restart"\],"exit":1' <<<"$OUT")" 2 "failed restarts"
+expect_eq "$(grep -c '"args":\["restart"\],"exit":0' <<<"$OUT")" 1 "successful restarts"
 sim service mesktraced running
 
 case_ "a missing configuration file"
