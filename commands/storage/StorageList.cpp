@@ -159,6 +159,7 @@ void StorageList::ExecuteInternal(std::shared_ptr<Input> input, std::shared_ptr<
             auto row = GetOutputStructure();
             MeskDiskInfo disk;
             info->GetDiskInfo(MeskUtil::StringToMeskUuid(text), luns, disk);
+            // The record holds one name and one deduplication flag; each shows under two fields.
             auto name = MetaString::New(disk.name);
             auto deduplication = MetaBool::New(disk.deduplication);
             row->SetField("Device", name, MetaStruct::_docEmpty);
