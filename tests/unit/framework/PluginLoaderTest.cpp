@@ -1,6 +1,5 @@
 #include "PluginLoader.h"
 
-#include <dlfcn.h>
 #include <unistd.h>
 
 #include <gtest/gtest.h>
@@ -29,11 +28,9 @@ std::string OtherPlugin() {
     return TestPluginDir() + "/libother_mesk_plugin.so";
 }
 
-// The framework library itself: a loadable library without the entry point.
-std::string FrameworkLibrary() {
-    Dl_info info{};
-    dladdr(reinterpret_cast<void*>(&Kalmor::AutoCli::Namespace::New), &info);
-    return info.dli_fname ? info.dli_fname : "";
+// A loadable library without the entry point.
+std::string NoEntryLibrary() {
+    return TestPluginDir() + "/unusable/libno_entry_plugin.so";
 }
 
 class TempDir {
@@ -80,7 +77,7 @@ TEST(PluginLoader, ReportsAndSkipsBrokenLibrariesAndLoadsEachLibraryOnce) {
     }
     TempDir dir;
     dir.Write("broken.so", "not a library\n");
-    dir.Copy(FrameworkLibrary(), "no-entry.so");
+    dir.Copy(NoEntryLibrary(), "no-entry.so");
     dir.Copy(OtherPlugin(), "other.so");
     dir.Write("readme.txt", "ignored\n");
     ASSERT_EQ(symlink((dir.path + "/other.so").c_str(), (dir.path + "/x-link.so").c_str()), 0);
