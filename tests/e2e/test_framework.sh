@@ -52,11 +52,6 @@ expect_err ""
 case_ "the other formatters, chosen before or after the command"
 run --formatter=json mesk other hello -n bob -i a
 expect_out '{"Greeting":"Hello, bob","Count":1,"Items":["a"],"Ok":true}'
-run mesk other hello -n bob -i a --formatter json-pretty
-expect_rc 0
-expect_out_has '  "Items": [
-    "a"
-  ],'
 run mesk other hello --name=bob --formatter table
 expect_out "Greeting    Items  Count
 ----------  -----  -------
@@ -80,13 +75,8 @@ while IFS='|' read -r message args; do
 done <<'CASES'
 missing required option '--name'|-c 1
 unknown option '--bogus'|-n a --bogus
-option '--count' needs a decimal integer (got '1x')|-n a -c 1x
 option '--count' must be between 0 and 512 (got '513')|-n a --count=513
-option '--count' is out of the 64-bit integer range (got '99999999999999999999')|-n a -c 99999999999999999999
-option '--loud' needs true or false (got 'maybe')|-n a -l maybe
 option '--loud' needs a value: true or false|-n a --loud
-option '--role' must be one of witness, node (got 'master')|-n a -r master
-option '--name' given more than once|-n a -n b
 unknown field 'Nope' for --fields; valid choices: Greeting, Count, Items, Ok|-n a --fields Nope
 CASES
 run mesk other hello -n "$(printf 'two\nlines')"
