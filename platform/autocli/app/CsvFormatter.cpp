@@ -1,5 +1,6 @@
 // The "csv" formatter: a header row of field names and one row per structure.
 #include "Formatter.h"
+#include "Text.h"
 
 namespace Kalmor {
 namespace AutoCli {
@@ -8,8 +9,10 @@ namespace App {
 namespace {
 
 // Quotes a cell when it holds a comma, a quotation mark or a line break, doubling the
-// quotation marks inside.
-std::string Cell(const std::string& value) {
+// quotation marks inside. Bytes that are not UTF-8 become U+FFFD, as in the JSON output, so
+// that a reader decoding UTF-8 gets the same text from both.
+std::string Cell(const std::string& raw) {
+    const std::string value = ValidUtf8(raw);
     if (value.find_first_of(",\"\r\n") == std::string::npos) {
         return value;
     }

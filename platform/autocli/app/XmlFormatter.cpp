@@ -55,6 +55,22 @@ std::string Escape(const std::string& raw) {
     return text;
 }
 
+// An attribute value: parsers turn a literal tab or line break there into a blank, so those
+// are written as character references to read back unchanged.
+std::string EscapeAttribute(const std::string& raw) {
+    std::string text;
+    for (char c : Escape(raw)) {
+        if (c == '\t') {
+            text += "&#9;";
+        } else if (c == '\n') {
+            text += "&#10;";
+        } else {
+            text += c;
+        }
+    }
+    return text;
+}
+
 const char* ElementName(MetaObj::MetaType type) {
     switch (type) {
         case MetaObj::META_BOOL:
@@ -106,9 +122,10 @@ void AppendValue(std::string& text, const MetaObject* value, size_t indent) {
     }
     if (value->GetType() == MetaObj::META_STRUCT) {
         const auto& structure = static_cast<const MetaObj::MetaStruct&>(*value);
-        AppendLine(text, indent, "<structure name=\"" + Escape(structure.GetName()) + "\">");
+        AppendLine(text, indent,
+                   "<structure name=\"" + EscapeAttribute(structure.GetName()) + "\">");
         for (const auto& field : structure.GetFields()) {
-            std::string open = "<field name=\"" + Escape(field.name) + "\">";
+            std::string open = "<field name=\"" + EscapeAttribute(field.name) + "\">";
             if (IsScalar(field.value.get())) {
                 AppendLine(text, indent + kIndentStep,
                            open + Scalar(field.value.get()) + "</field>");
