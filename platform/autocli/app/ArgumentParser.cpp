@@ -234,6 +234,8 @@ bool TakeGlobalOption(const std::vector<std::string>& words, size_t& index, Glob
         globals.help = true;
     } else if (word == "--list-commands") {
         globals.listCommands = true;
+    } else if (word == "--reference") {
+        globals.reference = true;
     } else if (word == "--debug") {
         globals.debug = true;
     } else if (word == "--no-header") {

@@ -16,6 +16,7 @@ namespace App {
 struct GlobalOptions {
     bool help = false;          // --help, -h
     bool listCommands = false;  // --list-commands
+    bool reference = false;     // --reference
     bool debug = false;         // --debug
     bool noHeader = false;      // --no-header
     std::string formatter;      // --formatter NAME; empty: the command's default

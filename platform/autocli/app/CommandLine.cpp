@@ -6,8 +6,10 @@
 
 #include "ArgumentParser.h"
 #include "CommandTree.h"
+#include "Completion.h"
 #include "Formatter.h"
 #include "Help.h"
+#include "Reference.h"
 #include "Text.h"
 
 namespace Kalmor {
@@ -86,6 +88,10 @@ RunResult RunCommand(CommandSpec& command, const std::vector<std::string>& words
         result.out = ListCommands(command);
         return result;
     }
+    if (globals.reference) {
+        result.out = RenderReference(command.GetThis());
+        return result;
+    }
 
     std::string formatterName = globals.formatter;
     if (formatterName.empty()) {
@@ -135,10 +141,37 @@ RunResult RunCommand(CommandSpec& command, const std::vector<std::string>& words
     return result;
 }
 
+// The words that autocli answers itself: `__complete <words...>` for the shell, and
+// `completion bash` unless a plug-in registered "completion" at the root.
+bool RunBuiltin(const std::vector<std::string>& words, const std::shared_ptr<NamespaceNode>& root,
+                RunResult& result) {
+    if (words.empty()) {
+        return false;
+    }
+    if (words[0] == kCompleteWord) {
+        result.out = RenderCompletion(
+            Complete(std::vector<std::string>(words.begin() + 1, words.end()), root));
+        return true;
+    }
+    if (words[0] != "completion" || root->HasNamespaceNode("completion")) {
+        return false;
+    }
+    if (words.size() == 2 && words[1] == "bash") {
+        result.out = BashCompletionScript();
+    } else {
+        result.err = "autocli: completion: name the shell; valid choices: bash\n";
+        result.status = kExitUsage;
+    }
+    return true;
+}
+
 }  // namespace
 
 RunResult Run(const std::vector<std::string>& words, const std::shared_ptr<NamespaceNode>& root) {
     RunResult result;
+    if (RunBuiltin(words, root, result)) {
+        return result;
+    }
     GlobalOptions globals;
     std::shared_ptr<NamespaceNode> node = root;
     size_t index = 0;
@@ -193,6 +226,10 @@ RunResult Run(const std::vector<std::string>& words, const std::shared_ptr<Names
     }
     if (globals.listCommands) {
         result.out = ListCommands(*node);
+        return result;
+    }
+    if (globals.reference) {
+        result.out = RenderReference(node);
         return result;
     }
     result.out = RenderNamespaceHelp(*node);

@@ -31,6 +31,10 @@ struct RunResult {
 // status 2, and a script that forgot a word does not take the help for a result.
 RunResult Run(const std::vector<std::string>& words, const std::shared_ptr<NamespaceNode>& root);
 
+// The hidden first word of a shell completion request (`autocli __complete <words...>`).
+// Its answer goes to stdout with status 0 whatever the words, and nothing to stderr.
+constexpr char kCompleteWord[] = "__complete";
+
 }  // namespace App
 }  // namespace AutoCli
 }  // namespace Kalmor

@@ -119,13 +119,15 @@ std::string RenderNamespaceHelp(const NamespaceNode& node) {
                     {"--fields A,B", "Show only these fields (simple, table and csv)"},
                     {"--no-header", "Leave out the header row of table and csv output"},
                     {"--list-commands", "Print every command path, one per line"},
+                    {"--reference", "Print the command reference as Markdown"},
                     {"--debug", "Report on stderr whether the command completed its output"},
                     {"-h, --help", "Show the help of a namespace or command"},
                 });
         text +=
             "\nThe options other than --help and --list-commands may also follow a command\n"
             "that has no option of the same name. Set AUTOCLI_PLUGIN_PATH (directories\n"
-            "separated by colons) to load plug-ins from other directories.\n";
+            "separated by colons) to load plug-ins from other directories.\n"
+            "`autocli completion bash` prints the script that completes commands in bash.\n";
     }
     return text;
 }

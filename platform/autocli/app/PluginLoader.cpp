@@ -4,6 +4,7 @@
 #include <dirent.h>
 #include <dlfcn.h>
 #include <sys/stat.h>
+#include <unistd.h>
 
 #include <algorithm>
 #include <exception>
@@ -82,6 +83,17 @@ void* OpenPlugin(const std::string& path, AutoCli_RegisterNamespacesFn& entry,
 }
 
 }  // namespace
+
+std::string ExecutableDirectory() {
+    std::string path(4096, '\0');
+    ssize_t length = readlink("/proc/self/exe", &path[0], path.size());
+    if (length <= 0 || static_cast<size_t>(length) >= path.size()) {
+        return std::string();
+    }
+    path.resize(static_cast<size_t>(length));
+    size_t slash = path.rfind('/');
+    return slash == std::string::npos ? std::string() : path.substr(0, slash == 0 ? 1 : slash);
+}
 
 std::vector<std::string> PluginDirectories(const char* overridePath,
                                            const std::string& defaultPath) {

@@ -16,6 +16,11 @@ namespace App {
 std::vector<std::string> PluginDirectories(const char* overridePath,
                                            const std::string& defaultPath);
 
+// The directory of the running executable, or the empty text when the system does not say.
+// An installed autocli finds its plug-ins relative to it, so that the installed tree may be
+// moved (a package unpacked under another root) and still work.
+std::string ExecutableDirectory();
+
 struct PluginReport {
     std::vector<std::string> loaded;    // paths of the libraries that registered
     std::vector<std::string> problems;  // one message per library that failed, for stderr

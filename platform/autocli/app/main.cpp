@@ -2,6 +2,7 @@
 #include <unistd.h>
 
 #include <cstdlib>
+#include <cstring>
 #include <string>
 #include <vector>
 
@@ -21,6 +22,14 @@ void WriteAll(int fd, const std::string& text) {
     }
 }
 
+// Where plug-ins are looked for when AUTOCLI_PLUGIN_PATH is unset: the installed plug-in
+// directory relative to this executable first, then the build's and the installed one.
+std::string DefaultPluginPath() {
+    const std::string beside = Kalmor::AutoCli::App::ExecutableDirectory();
+    std::string path = AUTOCLI_DEFAULT_PLUGIN_PATH;
+    return beside.empty() ? path : beside + "/" + AUTOCLI_PLUGIN_DIR_FROM_EXECUTABLE + ":" + path;
+}
+
 }  // namespace
 
 int main(int argc, char** argv) {
@@ -29,13 +38,18 @@ int main(int argc, char** argv) {
     std::shared_ptr<NamespaceNode> root = Namespace::New();
     App::PluginReport report;
     App::LoadPlugins(
-        App::PluginDirectories(std::getenv("AUTOCLI_PLUGIN_PATH"), AUTOCLI_DEFAULT_PLUGIN_PATH),
-        root, report);
+        App::PluginDirectories(std::getenv("AUTOCLI_PLUGIN_PATH"), DefaultPluginPath()), root,
+        report);
+    // A completion request runs on every key press: a broken plug-in must not scribble over
+    // the command line being typed.
+    const bool completing = argc > 1 && std::strcmp(argv[1], App::kCompleteWord) == 0;
     std::string problems;
     for (const auto& problem : report.problems) {
         problems += "autocli: " + problem + "\n";
     }
-    WriteAll(STDERR_FILENO, problems);
+    if (!completing) {
+        WriteAll(STDERR_FILENO, problems);
+    }
 
     App::RunResult result = App::Run(std::vector<std::string>(argv + 1, argv + argc), root);
     WriteAll(STDOUT_FILENO, result.out);

@@ -1,0 +1,79 @@
+#!/bin/bash
+# Shell completion end to end: `autocli __complete` over the mesk plug-in and the second test
+# plug-in together (commands of any plug-in complete, nothing regenerated), and the bash
+# adaptor from `autocli completion bash` driven through COMP_WORDS and COMP_CWORD.
+. "$(dirname "$0")/lib.sh"
+
+PLUGINS="${MESK_TEST_PLUGIN_DIR:-$(dirname "$AUTOCLI")/../../test-plugins}"
+export AUTOCLI_PLUGIN_PATH="$AUTOCLI_PLUGIN_PATH:$PLUGINS"
+
+case_ "__complete at each level: namespaces, commands, options, values"
+while IFS='|' read -r expected words; do
+    # shellcheck disable=SC2086
+    eval "set -- $words"
+    run __complete "$@"
+    expect_rc 0
+    expect_err ""
+    expect_eq "$(printf '%s' "$OUT" | tr '\n' ' ')" "$expected" "__complete $words"
+done <<'CASES'
+mesk :4|''
+storage :4|mesk st
+other :4|mesk o
+hello :4|mesk other ''
+diskgroup :4|mesk storage d
+--device --uuid --formatter --fields --no-header --debug --help :4|mesk storage list ''
+--formatter --fields --no-header --debug --help -h :4|mesk storage list -d x -u y -
+cluster vdisk vmnamespace vmswap vmem :4|mesk policy getdefault -c ''
+--policy-class=vmnamespace --policy-class=vmswap --policy-class=vmem :4|mesk policy setdefault --policy-class=vm
+true false :4|mesk storage automode set --enabled ''
+witness node :4|mesk other hello --role ''
+true false :4|mesk other hello -l ''
+:4|mesk other hello --count ''
+:0|mesk other hello --name ''
+json json-pretty :4|--formatter js
+:1|mesk nope ''
+bash :4|completion b
+CASES
+
+case_ "a plug-in that cannot be loaded stays silent during completion"
+BROKEN="$E2E_DIR/plugins"
+mkdir -p "$BROKEN"
+echo "not a library" >"$BROKEN/broken.so"
+AUTOCLI_PLUGIN_PATH="$BROKEN:$AUTOCLI_PLUGIN_PATH" run __complete mesk st
+expect_rc 0
+expect_out "storage
+:4"
+expect_err ""
+AUTOCLI_PLUGIN_PATH="$BROKEN" run __complete mesk ""
+expect_rc 0
+expect_out ":1"
+expect_err ""
+
+case_ "the bash adaptor fills COMPREPLY from autocli"
+run completion bash
+expect_rc 0
+SCRIPT="$E2E_DIR/autocli.bash"
+printf '%s\n' "$OUT" >"$SCRIPT"
+# shellcheck disable=SC2016
+complete_in_bash() {
+    PATH="$(dirname "$AUTOCLI"):$PATH" bash -c '
+        source "$1"; shift
+        COMP_WORDS=("$@"); COMP_CWORD=$(($# - 1))
+        _autocli
+        printf "%s\n" "${COMPREPLY[@]}"' bash "$SCRIPT" "$@"
+}
+_capture complete_in_bash autocli mesk st
+expect_out "storage"
+expect_err ""
+_capture complete_in_bash autocli mesk storage list --d
+expect_out "--device
+--debug"
+# bash splits "--formatter=js" at "="; the candidates replace only what follows it.
+_capture complete_in_bash autocli --formatter = js
+expect_out "json
+json-pretty"
+_capture complete_in_bash autocli mesk nope ""
+expect_out ""
+expect_err ""
+
+finish
