@@ -476,15 +476,19 @@ class SimInfo : public HostCtl::Mesk::MeskInfo2 {
                 Json network = store.ReadSection("network");
                 Json& interfaces = network["interfaces"];
                 auto it = FindInterface(interfaces, interfaceName);
-                if (it == interfaces.end() || !(*it)[flag].get<bool>()) {
-                    // With force the service is told anyway; nothing changes.
-                    if (force) return;
-                    Refuse("The interface " + Quoted(interfaceName) + " is not configured for " +
-                           trafficType + " traffic");
+                if (it == interfaces.end()) {
+                    // An interface never configured is refused; with force the service is told
+                    // anyway. One that this invocation already took out (its other traffic
+                    // type went first) has nothing left to remove.
+                    if (force || host_.RemovedInThisInvocation(interfaceName)) return;
+                    Refuse("The interface " + Quoted(interfaceName) + " is not configured");
                 }
+                // An interface that does not carry this traffic type has nothing to remove.
+                if (!(*it)[flag].get<bool>()) return;
                 (*it)[flag] = false;
                 if (!(*it)["meskTraffic"].get<bool>() && !(*it)["witnessTraffic"].get<bool>()) {
                     interfaces.erase(it);
+                    host_.NoteRemoved(interfaceName);
                 }
                 network["persisted"] = interfaces;
                 store.WriteSection("network", network);

@@ -8,6 +8,7 @@
 
 #include <map>
 #include <memory>
+#include <set>
 #include <string>
 #include <vector>
 
@@ -85,6 +86,11 @@ class SimHost : public HostBackend {
     }
     // Writes the calls recorded so far to the call log.
     void Flush();
+    // Interfaces whose last traffic type this process removed.
+    bool RemovedInThisInvocation(const std::string& name) const {
+        return removedInterfaces_.count(name) != 0;
+    }
+    void NoteRemoved(const std::string& name) { removedInterfaces_.insert(name); }
 
   private:
     std::vector<CallRecord> Pending() const;
@@ -96,6 +102,7 @@ class SimHost : public HostBackend {
     std::vector<Fault> faults_;
     std::map<std::string, int64_t> callCounts_;
     std::vector<std::pair<int64_t, Json>> pending_;  // time and entry of each call
+    std::set<std::string> removedInterfaces_;
 };
 
 // Runs `body` as the operation `op` of `host`: recorded, subject to injected failures, and

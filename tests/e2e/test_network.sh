@@ -92,6 +92,15 @@ expect_out $'vmk1,false,mesk\nvmk1,false,witness'
 run mesk network list --formatter=json
 expect_out '[]'
 
+case_ "an ordinary interface is removed without --force; an unknown one is refused"
+run mesk network ip add -i vmk2
+run mesk network remove -i vmk2
+expect_rc 0
+expect_out ''
+run mesk network remove -i vmk2
+expect_rc 1
+expect_err_has 'is not configured'
+
 case_ "a failed mesk removal is false and stops the witness removal"
 run mesk network ip add -i vmk1 -T mesk -T witness
 expect_rc 0

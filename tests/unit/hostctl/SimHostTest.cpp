@@ -251,9 +251,9 @@ TEST_F(SimHost, InterfacesByTrafficType) {
     EXPECT_TRUE(Info().RemoveZuvNic("zuvnic1", false, "witness"));
     EXPECT_FALSE(Info().IsZuvNicInUse("zuvnic1", "witness"));
     EXPECT_TRUE(Info().IsZuvNicInUse("zuvnic1", "mesk"));
-    ExpectRefusal("not configured for witness",
-                  [&] { Info().RemoveZuvNic("zuvnic1", false, "witness"); });
-    EXPECT_FALSE(Info().RemoveZuvNic("zuvnic1", true, "witness"));
+    EXPECT_FALSE(Info().RemoveZuvNic("zuvnic1", false, "witness"));
+    ExpectRefusal("not configured", [&] { Info().RemoveZuvNic("nosuch", false, "mesk"); });
+    EXPECT_FALSE(Info().RemoveZuvNic("nosuch", true, "mesk"));
     Info().RemoveZuvNic("zuvnic1", false, "mesk");
     EXPECT_EQ(Info().GetZuvNicConfigs().size(), 1u);
 
