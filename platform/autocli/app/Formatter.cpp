@@ -135,6 +135,10 @@ std::vector<const MetaStruct::Field*> OutputLayout::Fields(const MetaStruct& str
 }
 
 std::string OutputLayout::Unit(const std::string& structName, const std::string& field) const {
+    // Asked for every field of every element: most commands have no units at all.
+    if (units_.empty()) {
+        return std::string();
+    }
     auto found = units_.find(structName + "." + field);
     return found == units_.end() ? std::string() : found->second;
 }

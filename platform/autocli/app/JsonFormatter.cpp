@@ -27,16 +27,22 @@ nlohmann::ordered_json ToJson(const MetaObject* value) {
             return scalar.HasValue() ? nlohmann::ordered_json(scalar.GetValue()) : nullptr;
         }
         case MetaObj::META_STRUCT: {
+            // A structure's field names are unique, so members are appended without the
+            // lookup that operator[] makes for every one of them.
+            const auto& fields = static_cast<const MetaObj::MetaStruct&>(*value).GetFields();
             nlohmann::ordered_json object = nlohmann::ordered_json::object();
-            for (const auto& field : static_cast<const MetaObj::MetaStruct&>(*value).GetFields()) {
-                object[field.name] = ToJson(field.value.get());
+            auto& members = object.get_ref<nlohmann::ordered_json::object_t&>();
+            members.reserve(fields.size());
+            for (const auto& field : fields) {
+                members.emplace_back(field.name, ToJson(field.value.get()));
             }
             return object;
         }
         case MetaObj::META_LIST: {
+            const auto& elements = static_cast<const MetaObj::MetaList&>(*value).GetElements();
             nlohmann::ordered_json array = nlohmann::ordered_json::array();
-            for (const auto& element :
-                 static_cast<const MetaObj::MetaList&>(*value).GetElements()) {
+            array.get_ref<nlohmann::ordered_json::array_t&>().reserve(elements.size());
+            for (const auto& element : elements) {
                 array.push_back(ToJson(element.get()));
             }
             return array;

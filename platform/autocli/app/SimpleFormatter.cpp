@@ -62,9 +62,13 @@ void AppendStruct(std::string& text, const MetaStruct& structure, size_t indent,
             AppendNested(text, *value, fieldIndent + kIndentStep, layout);
             continue;
         }
-        std::string shown = ValueText(value, layout.Unit(structure.GetName(), field->name));
-        AppendLine(text, fieldIndent,
-                   shown.empty() ? field->name + ":" : field->name + ": " + shown);
+        // Appended piece by piece: a long listing has tens of thousands of these lines.
+        const std::string shown = ValueText(value, layout.Unit(structure.GetName(), field->name));
+        text.append(fieldIndent, ' ');
+        text += field->name;
+        text += shown.empty() ? ":" : ": ";
+        text += shown;
+        text += '\n';
     }
 }
 
