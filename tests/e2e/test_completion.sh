@@ -7,7 +7,7 @@
 PLUGINS="${MESK_TEST_PLUGIN_DIR:-$(dirname "$AUTOCLI")/../../test-plugins}"
 export AUTOCLI_PLUGIN_PATH="$AUTOCLI_PLUGIN_PATH:$PLUGINS"
 
-case_ "__complete at each level: namespaces, commands, options, values"
+case_ "__complete over both plug-ins: namespaces, commands, values"
 while IFS='|' read -r expected words; do
     # shellcheck disable=SC2086
     eval "set -- $words"
@@ -19,20 +19,9 @@ done <<'CASES'
 mesk :4|''
 storage :4|mesk st
 other :4|mesk o
-hello :4|mesk other ''
-diskgroup :4|mesk storage d
---device --uuid --formatter --fields --no-header --debug --help :4|mesk storage list ''
---formatter --fields --no-header --debug --help -h :4|mesk storage list -d x -u y -
 cluster vdisk vmnamespace vmswap vmem :4|mesk policy getdefault -c ''
---policy-class=vmnamespace --policy-class=vmswap --policy-class=vmem :4|mesk policy setdefault --policy-class=vm
 true false :4|mesk storage automode set --enabled ''
-witness node :4|mesk other hello --role ''
-true false :4|mesk other hello -l ''
-:4|mesk other hello --count ''
-:0|mesk other hello --name ''
-json json-pretty :4|--formatter js
 :1|mesk nope ''
-bash :4|completion b
 CASES
 
 case_ "a plug-in that cannot be loaded stays silent during completion"
