@@ -101,7 +101,16 @@ class SimHost : public HostBackend {
     std::string invocation_;
     std::vector<Fault> faults_;
     std::map<std::string, int64_t> callCounts_;
-    std::vector<std::pair<int64_t, Json>> pending_;  // time and entry of each call
+    // A call not yet written to the log. Its entry text is made only when it is written, so
+    // that a listing of thousands of disks does not build a JSON object for each call.
+    struct PendingCall {
+        int64_t time;  // nanoseconds since the epoch
+        std::string op;
+        Json args;
+        bool failed = false;
+        std::string error;
+    };
+    std::vector<PendingCall> pending_;
     std::set<std::string> removedInterfaces_;
 };
 

@@ -210,10 +210,17 @@ std::vector<std::string> StateStore::ReadGroupedDiskUuids() {
 }
 
 bool StateStore::ReadDisk(const std::string& uuid, Json& disk) {
+    std::string record;
+    if (!ReadDiskRecord(uuid, record)) return false;
+    disk = Json::parse(record);
+    return true;
+}
+
+bool StateStore::ReadDiskRecord(const std::string& uuid, std::string& record) {
     Use query(Statement("SELECT record FROM disk WHERE uuid = ?1"));
     Bind(query, 1, uuid);
     if (sqlite3_step(query) != SQLITE_ROW) return false;
-    disk = Json::parse(ColumnText(query, 0));
+    record = ColumnText(query, 0);
     return true;
 }
 
@@ -312,10 +319,20 @@ void StateStore::ClearFaults() {
 }
 
 void StateStore::AppendCalls(const std::string& invocation, const std::vector<CallRecord>& calls) {
+    bool logged = false;
     {
+        Use query(Statement("SELECT 1 FROM call_log WHERE invocation = ?1 LIMIT 1"));
+        Bind(query, 1, invocation);
+        logged = sqlite3_step(query) == SQLITE_ROW;
+    }
+    if (logged) {
         Use statement(Statement("DELETE FROM call_log WHERE invocation <> ?1"));
         Bind(statement, 1, invocation);
         if (sqlite3_step(statement) != SQLITE_DONE) Fail("cannot clear the call log");
+    } else {
+        // The invocation's first calls: every row is another's, and a DELETE without WHERE
+        // drops the table's pages at once instead of tens of thousands of rows one by one.
+        ClearCalls();
     }
     Use statement(Statement("INSERT INTO call_log(invocation, time, entry) VALUES(?1, ?2, ?3)"));
     for (const CallRecord& call : calls) {

@@ -72,7 +72,8 @@ class StateStore {
     std::vector<Lun> ReadLuns();                      // disks for which the host has a device
     std::vector<std::string> ReadGroupedDiskUuids();  // disks held in a disk group
     bool ReadDisk(const std::string& uuid, Json& disk);
-    bool ReadDiskByName(const std::string& name, Json& disk);  // a disk with a device
+    bool ReadDiskRecord(const std::string& uuid, std::string& record);  // its JSON text
+    bool ReadDiskByName(const std::string& name, Json& disk);           // a disk with a device
     std::vector<Json> ReadDiskGroup(const std::string& groupUuid);
     void UpdateDisk(const Json& disk);  // by its UUID
     void DeleteDisk(const std::string& uuid);
