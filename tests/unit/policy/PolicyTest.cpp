@@ -9,7 +9,6 @@
 #include "commands/policy/PolicyClearDefault.h"
 #include "commands/policy/PolicyGetDefault.h"
 #include "commands/policy/PolicySetDefault.h"
-#include "unit/DescribeCommand.h"
 
 namespace OrvaneCli {
 namespace MeskNamespace {
@@ -124,29 +123,6 @@ TEST_F(PolicyTest, ResultAndCompletionAfterALibraryFailure) {
         Mock::VerifyAndClearExpectations(&info);
         Mock::VerifyAndClearExpectations(&host);
     }
-}
-
-TEST(PolicyCommands, DeclareTheirMetadataParametersAndResult) {
-    using Lines = std::vector<std::string>;
-    const std::string classes =
-        " enum cluster=cluster vdisk=vdisk vmnamespace=vmnamespace vmswap=vmswap vmem=vmem: ";
-    EXPECT_EQ(MeskTest::DescribeCommand(*PolicyGetDefault::New()),
-              (Lines{"Get default Mesk storage policy values.", "type=fetcher", "formatter=table",
-                     "fields:Policy=Policy Class,Policy Value",
-                     "--policy-class -c text optional" + classes +
-                         "Mesk policy class whose default value to get. If not provided, "
-                         "defaults for all classes will be retrieved. Options are: %ENUM%.",
-                     "list of Policy{Policy Class:text,Policy Value:text,}"}));
-    EXPECT_EQ(MeskTest::DescribeCommand(*PolicySetDefault::New()),
-              (Lines{"Set default Mesk storage policy values.", "type=operation", "formatter=",
-                     "--policy-class -c text required" + classes +
-                         "Mesk policy class whose default value to set. Options are: %ENUM%.",
-                     "--policy -p text required: Mesk policy to set as default, in the form of a "
-                     "string. Options are: ",
-                     "bool"}));
-    EXPECT_EQ(MeskTest::DescribeCommand(*PolicyClearDefault::New()),
-              (Lines{"Clear default Mesk storage policy values.", "type=operation",
-                     "formatter=", "bool"}));
 }
 
 // After its first sentence the help of `policy` lists seven options, one line each, each

@@ -7,7 +7,6 @@
 #include "commands/resync/ResyncBandwidthGet.h"
 #include "commands/resync/ResyncThrottleGet.h"
 #include "commands/resync/ResyncThrottleSet.h"
-#include "unit/DescribeCommand.h"
 
 namespace OrvaneCli {
 namespace MeskNamespace {
@@ -80,23 +79,6 @@ TEST_F(ResyncTest, FailureGivesTheBareMessageAndNoResult) {
         Mock::VerifyAndClearExpectations(&info);
         Mock::VerifyAndClearExpectations(&host);
     }
-}
-
-TEST(ResyncCommands, DeclareTheirMetadataParametersAndResult) {
-    using Lines = std::vector<std::string>;
-    EXPECT_EQ(
-        MeskTest::DescribeCommand(*ResyncBandwidthGet::New()),
-        (Lines{"Get information about Mesk resync bandwidth", "type=fetcher", "formatter=simple",
-               "units:ResyncBandwidth.Rate=Mbps", "ResyncBandwidth{Rate:int,}"}));
-    EXPECT_EQ(
-        MeskTest::DescribeCommand(*ResyncThrottleGet::New()),
-        (Lines{"Get information about Mesk resync throttling", "type=fetcher", "formatter=simple",
-               "units:ResyncThrottle.Level=Mbps", "ResyncThrottle{Level:int,}"}));
-    EXPECT_EQ(MeskTest::DescribeCommand(*ResyncThrottleSet::New()),
-              (Lines{"Configure Mesk resync throttling", "type=operation", "formatter=",
-                     "--level - int required range 0..512: Set Mesk resync throttle level in "
-                     "Mbps (%ENUM%, 0 means no throttling)",
-                     "bool"}));
 }
 
 }  // namespace
