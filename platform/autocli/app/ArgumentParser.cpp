@@ -105,8 +105,9 @@ bool HasControlCharacter(const std::string& text) {
     return false;
 }
 
+// Quotes a text for a message; what the user typed is shown on one line (MessageText).
 std::string Quoted(const std::string& text) {
-    return "'" + text + "'";
+    return "'" + MessageText(text) + "'";
 }
 
 std::string EnumValues(const ParameterConstraint& constraint) {
@@ -170,8 +171,8 @@ std::string Store(const ParameterSpec& parameter, const std::string& value,
             int64_t number = 0;
             switch (ParseInt64(value, number)) {
                 case IntParse::NotANumber:
-                    return "option " + option + " needs a decimal integer (got " +
-                           Quoted(ValidUtf8(value)) + ")";
+                    return "option " + option + " needs a decimal integer (got " + Quoted(value) +
+                           ")";
                 case IntParse::OutOfRange:
                     return "option " + option + " is out of the 64-bit integer range (got " +
                            Quoted(value) + ")";
@@ -191,8 +192,7 @@ std::string Store(const ParameterSpec& parameter, const std::string& value,
         case CallSpec::PARAM_BOOL: {
             bool flag = false;
             if (!ParseBool(value, flag)) {
-                return "option " + option + " needs true or false (got " +
-                       Quoted(ValidUtf8(value)) + ")";
+                return "option " + option + " needs true or false (got " + Quoted(value) + ")";
             }
             input.SetParameterBool(name, flag);
             return std::string();
@@ -294,7 +294,7 @@ ParseResult ParseArguments(const std::vector<std::string>& words, const InputSpe
                 valueGiven = true;
             }
         } else {
-            fail("unexpected argument " + Quoted(ValidUtf8(word)));
+            fail("unexpected argument " + Quoted(word));
             continue;
         }
 
@@ -310,7 +310,7 @@ ParseResult ParseArguments(const std::vector<std::string>& words, const InputSpe
             }
             std::string option =
                 StartsWith(word, "--") ? word.substr(0, word.find('=')) : word.substr(0, 2);
-            fail("unknown option " + Quoted(ValidUtf8(option)));
+            fail("unknown option " + Quoted(option));
             continue;
         }
 

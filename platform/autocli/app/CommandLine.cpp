@@ -63,7 +63,7 @@ std::string CheckFields(CommandSpec& command, const std::vector<std::string>& fi
     }
     for (const auto& name : fields) {
         if (std::find(known.begin(), known.end(), name) == known.end()) {
-            return "unknown field '" + ValidUtf8(name) +
+            return "unknown field '" + MessageText(name) +
                    "' for --fields; valid choices: " + Join(known, ", ");
         }
     }
@@ -103,7 +103,7 @@ RunResult RunCommand(CommandSpec& command, const std::vector<std::string>& words
     FormatterFunction formatter = FindFormatter(formatterName);
     if (!formatter) {
         return UsageError(result, nullptr,
-                          "unknown formatter '" + ValidUtf8(formatterName) +
+                          "unknown formatter '" + MessageText(formatterName) +
                               "'; valid choices: " + Join(FormatterNames(), ", "));
     }
     if (globals.fieldsGiven) {
@@ -182,7 +182,7 @@ RunResult Run(const std::vector<std::string>& words, const std::shared_ptr<Names
             std::string error;
             if (!TakeGlobalOption(words, index, globals, error)) {
                 return UsageError(result, node.get(),
-                                  "unknown option '" + ValidUtf8(words[index]) + "'");
+                                  "unknown option '" + MessageText(words[index]) + "'");
             }
             if (!error.empty()) {
                 return UsageError(result, node.get(), error);

@@ -35,7 +35,7 @@ PathResolution ResolvePath(const std::shared_ptr<NamespaceNode>& root,
         if (!child) {
             const std::string where = resolution.node->GetPathString(' ');
             const auto choices = resolution.node->GetNamespaceNodeNames();
-            resolution.error = "'" + ValidUtf8(word) + "' is not a namespace or command" +
+            resolution.error = "'" + MessageText(word) + "' is not a namespace or command" +
                                (where.empty() ? std::string() : " in '" + where + "'") +
                                (choices.empty() ? "; no commands are registered"
                                                 : "; valid choices: " + Join(choices, ", "));

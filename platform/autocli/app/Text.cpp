@@ -127,6 +127,24 @@ std::string ValidUtf8(const std::string& text, bool forXml) {
     return clean;
 }
 
+std::string MessageText(const std::string& text) {
+    static const char kHex[] = "0123456789abcdef";
+    std::string line;
+    for (char c : ValidUtf8(text)) {
+        const auto byte = static_cast<unsigned char>(c);
+        if (c == '\n') {
+            line += "\\n";
+        } else if (c == '\r') {
+            line += "\\r";
+        } else if ((byte < 0x20 && c != '\t') || byte == 0x7F) {
+            line += std::string("\\x") + kHex[byte >> 4] + kHex[byte & 0xF];
+        } else {
+            line += c;
+        }
+    }
+    return line;
+}
+
 std::string PadRight(const std::string& text, size_t width) {
     size_t current = DisplayWidth(text);
     return current >= width ? text : text + std::string(width - current, ' ');

@@ -26,6 +26,11 @@ size_t DisplayWidth(const std::string& text);
 // feed and carriage return, and U+FFFE and U+FFFF).
 std::string ValidUtf8(const std::string& text, bool forXml = false);
 
+// A text the user typed, made fit to stand in a one-line message: ValidUtf8, and every
+// control character but tab written as an escape ("\n", "\r", "\x1b"), so that a value
+// echoed in an error can neither break the message into lines nor drive the terminal.
+std::string MessageText(const std::string& text);
+
 // The text padded with blanks to `width` display characters.
 std::string PadRight(const std::string& text, size_t width);
 

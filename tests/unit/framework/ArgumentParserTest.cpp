@@ -109,6 +109,15 @@ TEST(ArgumentParser, ParsesEveryKindAndRefusesBadValuesWithOneMessage) {
         {{"-n", std::string("a\0b", 3)},
          "option '--name' contains a control character; values must be a single line of text",
          false},
+        // A value echoed in a message stays on one line and cannot drive the terminal.
+        {{"-n", "a", "-c", "1\n2"},
+         "option '--count' needs a decimal integer (got '1\\n2')",
+         false},
+        {{"-n", "a", "--loud", "\x1b[31mtrue"},
+         "option '--loud' needs true or false (got '\\x1b[31mtrue')",
+         false},
+        {{"-n", "a", "--bo\rgus"}, "unknown option '--bo\\rgus'", false},
+        {{"-n", "a", "st\nray\xff"}, "unexpected argument 'st\\nray\xEF\xBF\xBD'", false},
         // The first problem is the one reported.
         {{"-c", "x", "--bogus"}, "option '--count' needs a decimal integer (got 'x')", false},
     };
