@@ -139,11 +139,11 @@ bool StateStore::Open() {
 
 bool StateStore::Prepare() {
     sqlite3_busy_timeout(db_, kBusyTimeoutMs);
-    // Without fsync, neither on commit nor when the log is folded back into the database:
-    // a killed process still leaves a consistent state, and only a crash of the machine
-    // could lose the last changes of a host that is simulated anyway. A sync costs each
-    // invocation milliseconds of waiting for the disk.
-    Exec("PRAGMA synchronous=OFF");
+    // In WAL mode, NORMAL syncs only when the log is folded back into the database, not on
+    // every commit: a killed process leaves a consistent state, and even a crash of the
+    // machine can lose at most the last changes, never corrupt the database. A sync on every
+    // commit would cost each invocation milliseconds of waiting for the disk.
+    Exec("PRAGMA synchronous=NORMAL");
     if (SchemaVersion() == kSchemaVersion) return false;
     if (SchemaVersion() > kSchemaVersion) {
         throw MeskCtlException("Simulated host state " + path_ + ": made by a newer hostsim");
