@@ -106,6 +106,19 @@ struct Host {
             root.WriteServices(document["services"]);
         }
     }
+
+    // Applies a JSON merge patch to the whole host. The host is read and written under one
+    // write transaction (its services' file included), so that concurrent merges all land.
+    void Merge(const Json& patch) {
+        Open();
+        StateStore::Transaction transaction(store);
+        Json document = Document();
+        document.merge_patch(patch);
+        document = HostCtlSim::NormalizeHost(document);
+        store.Replace(document);
+        root.WriteServices(document["services"]);
+        transaction.Commit();
+    }
 };
 
 std::string ReadInput(const std::string& file) {
@@ -126,12 +139,11 @@ int Load(const std::vector<std::string>& args) {
     Json input = Json::parse(ReadInput(args.back()), nullptr, false);
     if (input.is_discarded()) throw std::runtime_error(args.back() + ": not a JSON document");
     Host host;
-    Json document = input;
     if (merge) {
-        document = host.Document();
-        document.merge_patch(input);
+        host.Merge(input);
+    } else {
+        host.Replace(HostCtlSim::NormalizeHost(input), false);
     }
-    host.Replace(HostCtlSim::NormalizeHost(document), false);
     return 0;
 }
 

@@ -114,4 +114,18 @@ expect_eq "$final" "$((initial + changes))" "generation after $changes successfu
 echo "$changes of $((8 * ROUNDS)) joins and leaves changed the cluster"
 if [ "$changes" -gt 0 ]; then _pass; else _fail "no process changed the cluster"; fi
 
+case_ "8 hostsim merges of different keys all land"
+# A merge reads the host and writes it back whole; without one transaction around both, a
+# merge overwrote what another had written in between.
+"$HOSTSIM" reset >/dev/null
+for ((n = 0; n < 8; n++)); do
+    printf '{"policies": {"class%d": "policy %d"}}' "$n" "$n" >"$E2E_DIR/merge.$n.json"
+done
+for ((n = 0; n < 8; n++)); do "$HOSTSIM" load --merge "$E2E_DIR/merge.$n.json" & done
+wait
+sim show
+expect_eq "$(jq -c '[.policies | to_entries[] | select(.key | startswith("class")) | .value] | sort' <<<"$OUT")" \
+    '["policy 0","policy 1","policy 2","policy 3","policy 4","policy 5","policy 6","policy 7"]' \
+    "policies merged"
+
 finish
