@@ -11,6 +11,7 @@
 
 #include "HostBackend.h"
 #include "SimHost.h"
+#include "StateDocument.h"
 #include "hostctl/MeskCtlException.h"
 #include "hostctl/MeskInfo.h"
 #include "hostctl/MeskPlugin.h"
@@ -31,20 +32,22 @@ class SimFixture : public ::testing::Test {
     }
 
     ~SimFixture() override {
-        info_.reset();
-        plugin_.reset();
-        HostCtlSim::SetBackend(nullptr);
-        host_.reset();
+        EndInvocation();
         std::error_code error;
         std::filesystem::remove_all(directory_, error);
     }
 
-    // Ends the current invocation (its call log is written) and starts the next one.
-    void NewInvocation() {
+    // Ends the current invocation: its call log is written.
+    void EndInvocation() {
         info_.reset();
         plugin_.reset();
         HostCtlSim::SetBackend(nullptr);
         host_.reset();
+    }
+
+    // Ends the current invocation and starts the next one.
+    void NewInvocation() {
+        EndInvocation();
         host_ = std::make_unique<SimHost>(options_);
         HostCtlSim::SetBackend(host_.get());
     }
@@ -60,6 +63,14 @@ class SimFixture : public ::testing::Test {
 
     // The whole host as `hostsim show` prints it, less the services.
     Json State() { return host_->Store().Dump(); }
+
+    // Replaces the host by `document`, with the services of a fresh host.
+    void Load(Json document) {
+        document["services"] = HostCtlSim::DefaultHost()["services"];
+        HostCtlSim::StateStore::Transaction transaction(host_->Store());
+        host_->Store().Replace(HostCtlSim::NormalizeHost(document));
+        transaction.Commit();
+    }
 
     // Runs `action`, which must throw MeskCtlException with a message containing `text`,
     // and checks that it changed nothing.
@@ -88,8 +99,6 @@ const char* const kHdd1 = "mpx.pthba2:C0:T1:L0";
 const char* const kHdd2 = "mpx.pthba2:C0:T2:L0";
 const char* const kHdd3 = "mpx.pthba2:C0:T3:L0";
 const char* const kSsdUuid = "52a0e7c4-1b2d-4e3f-8a90-0b1c2d3e4f01";
-const char* const kHdd1Uuid = "52a0e7c4-1b2d-4e3f-8a90-0b1c2d3e4f02";
-const char* const kHdd2Uuid = "52a0e7c4-1b2d-4e3f-8a90-0b1c2d3e4f03";
 const char* const kClusterUuid = "52f1c2a0-7b3e-4d01-9a6e-00a1b2c3d4e5";
 
 }  // namespace SimTest
