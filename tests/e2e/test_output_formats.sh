@@ -1,12 +1,11 @@
 #!/bin/bash
-# Every fetcher's result on a populated simulated host, read back by standard tools: json and
-# json-pretty by jq (the same fields), xml by xmllint, csv with a header row of the json
-# field names.
+# Every fetcher's result on a populated host: json-pretty has the same fields as json, and csv
+# a header row of the json field names (that each format parses, test_bad_input.sh checks).
 . "$(dirname "$0")/lib.sh"
 
+# A stretched cluster, so that the preferred fault domain can be read too.
 sim populate --luns 3 --agents 2 --nics 2
 expect_rc 0
-# A stretched cluster, so that the preferred fault domain can be read too.
 sim load --merge - <<<'{"cluster":{"stretched":true}}'
 expect_rc 0
 
@@ -16,20 +15,16 @@ mapfile -t FETCHERS < <("$AUTOCLI" --reference |
 expect_eq "$([ "${#FETCHERS[@]}" -ge 10 ] && echo many)" many "fetchers found in the reference"
 
 for command in "${FETCHERS[@]}"; do
-    case_ "$command in every machine format"
+    case_ "$command in json, json-pretty and csv"
     # shellcheck disable=SC2086
     run $command --formatter json
     expect_rc 0
     json="$OUT"
-    if jq -e . >/dev/null <<<"$json"; then _pass; else _fail "jq cannot read the json"; fi
     # shellcheck disable=SC2086
     run $command --formatter json-pretty
     # The same fields in the same order (values may move on: cluster get tells the time).
-    expect_eq "$(jq -c '[paths]' <<<"$OUT")" "$(jq -c '[paths]' <<<"$json")" "json-pretty against json"
-    # shellcheck disable=SC2086
-    run $command --formatter xml
-    expect_rc 0
-    if xmllint --noout - <<<"$OUT" 2>/dev/null; then _pass; else _fail "xmllint refused the xml"; fi
+    expect_eq "$(jq -c '[paths]' <<<"$OUT")" "$(jq -c '[paths]' <<<"$json" || echo unreadable)" \
+        "json-pretty against json"
     # shellcheck disable=SC2086
     run $command --formatter csv
     expect_rc 0
