@@ -1,5 +1,7 @@
 #include "MockHost.h"
 
+#include <sstream>
+
 #include "hostctl/MeskUtil.h"
 
 namespace MeskTest {
@@ -202,8 +204,23 @@ void HostTest::SetEnabled(bool enabled, const std::string& clusterUuid) {
     info.clusterConfig.clusterUuid = clusterUuid;
 }
 
+std::shared_ptr<Kalmor::CallSpec::Input> InputOf(const std::string& options) {
+    auto input = Kalmor::CallSpec::Input::New();
+    std::istringstream words(options);
+    for (std::string word; words >> word;) {
+        const size_t equals = word.find('=');
+        input->AddParameterValue(word.substr(0, equals), word.substr(equals + 1));
+    }
+    return input;
+}
+
 std::vector<std::string> Errors(const Kalmor::CallSpec::Output& output) {
     return output.GetErrorMessages();
+}
+
+void ExpectRefused(const Kalmor::CallSpec::Output& output, const std::string& message) {
+    EXPECT_THAT(Errors(output), ::testing::ElementsAre(message));
+    EXPECT_TRUE(output.GetRootObject() == nullptr && !output.IsComplete());
 }
 
 bool BoolResult(const Kalmor::CallSpec::Output& output) {

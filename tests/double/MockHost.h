@@ -187,8 +187,14 @@ class HostTest : public ::testing::Test {
     ::testing::NiceMock<MockHost> host{info};
 };
 
+// A command's input from options written as "name=value name=value"; a list option is given
+// once per value.
+std::shared_ptr<Kalmor::CallSpec::Input> InputOf(const std::string& options);
+
 // Reading a result.
 std::vector<std::string> Errors(const Kalmor::CallSpec::Output& output);
+// A refusal before the command acted: that one error message, no result, output not complete.
+void ExpectRefused(const Kalmor::CallSpec::Output& output, const std::string& message);
 // The bare boolean result; fails the test when the root is not a set MetaBool.
 bool BoolResult(const Kalmor::CallSpec::Output& output);
 // The text, integer or boolean value of a structure's field; fails the test when it is

@@ -46,11 +46,6 @@ void ExpectAnswered(const Kalmor::CallSpec::Output& output, bool result) {
     EXPECT_THAT(Errors(output), IsEmpty());
     EXPECT_TRUE(BoolResult(output) == result && output.IsComplete());
 }
-// One error message, no result, output not complete.
-void ExpectRefused(const Kalmor::CallSpec::Output& output, const std::string& message) {
-    EXPECT_THAT(Errors(output), ElementsAre(message));
-    EXPECT_TRUE(output.GetRootObject() == nullptr && !output.IsComplete());
-}
 
 class ClusterTest : public HostTest {
   protected:

@@ -25,22 +25,6 @@ using ::testing::IsEmpty;
 using ::testing::Return;
 using Texts = std::vector<std::string>;
 
-// Options as "name=value name=value".
-std::shared_ptr<Input> InputOf(const std::string& options) {
-    auto input = Input::New();
-    std::istringstream words(options);
-    for (std::string word; words >> word;) {
-        const size_t equals = word.find('=');
-        input->SetParameter(word.substr(0, equals), word.substr(equals + 1));
-    }
-    return input;
-}
-
-void ExpectRefused(const Output& output, const std::string& message) {
-    EXPECT_THAT(Errors(output), ElementsAre(message));
-    EXPECT_TRUE(output.GetRootObject() == nullptr && !output.IsComplete());
-}
-
 // A listed agent as "NodeUuid|IsWitness|Supports Unicast|IP Address|Port|Iface Name".
 std::string Row(const std::shared_ptr<Kalmor::MetaObj::MetaObject>& row) {
     return TextField(row, "NodeUuid") + "|" + std::to_string(IntField(row, "IsWitness")) + "|" +

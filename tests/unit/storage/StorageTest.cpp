@@ -32,17 +32,6 @@ using ::testing::ElementsAreArray;
 
 enum Result { kNone, kFalse, kTrue };
 
-// Options as "name=value name=value"; a list option is given once per value.
-std::shared_ptr<Input> InputOf(const std::string& options) {
-    auto input = Input::New();
-    std::istringstream words(options);
-    for (std::string word; words >> word;) {
-        const size_t equals = word.find('=');
-        input->AddParameterValue(word.substr(0, equals), word.substr(equals + 1));
-    }
-    return input;
-}
-
 Result ResultOf(const Kalmor::CallSpec::Output& output) {
     auto value = std::dynamic_pointer_cast<MetaBool>(output.GetRootObject());
     return !value ? kNone : value->GetValue() ? kTrue : kFalse;
