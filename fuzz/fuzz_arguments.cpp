@@ -53,7 +53,7 @@ constexpr size_t kMaxWords = 32;
 
 const char kTraceFile[] =
     "# tracing service\n"
-    "MESKTRACED_LAST_SELECTED_VOLUME=\"/vmfs/volumes/trace\"\n"
+    "MESKTRACED_LAST_SELECTED_VOLUME=\"/scratch/trace\"\n"
     "MESKTRACED_ROTATE_MAX_FILES=8\n"
     "MESKTRACED_ROTATE_FILE_SIZE=45\n"
     "MESKTRACED_LOG_URGENT_TO_SYSLOG=1\n";

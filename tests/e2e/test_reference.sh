@@ -1,6 +1,7 @@
 #!/bin/bash
 # docs/commands.md is what `autocli --reference` prints for the commands as built, so a
 # command whose description, parameters or result changed without the reference fails here.
+# README's layout table names every folder of the tree.
 . "$(dirname "$0")/lib.sh"
 
 case_ "docs/commands.md matches the code"
@@ -16,5 +17,16 @@ else
     _fail "docs/commands.md is stale; regenerate it with: scripts/gen-docs ${MESK_BUILD_DIR:-}"
     head -n 80 "$E2E_DIR/reference.diff" >&2
 fi
+
+case_ "README's layout table names every folder"
+cd "$MESK_SOURCE_DIR"
+TABLE=$(grep '^| `' README.md)
+# Top-level folders, the stand-ins, the test kinds, and the one folder of commands that is no area.
+for dir in $(git ls-files 2>/dev/null |
+        sed -n 's#^\(platform/[^/]*\|tests/[^/]*\|commands/common\)/.*#\1#p; s#^\([^/]*\)/.*#\1#p' |
+        sort -u); do
+    if grep -qF "\`$dir/" <<<"$TABLE"; then _pass; else _fail "README.md's layout table lacks $dir/"; fi
+done
+cd - >/dev/null
 
 finish

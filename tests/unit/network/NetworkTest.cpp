@@ -58,7 +58,7 @@ std::vector<std::string> Row(const std::shared_ptr<Kalmor::MetaObj::MetaObject>&
     return row;
 }
 
-std::shared_ptr<Input> Named(const std::string& name = "vmk1", bool force = false) {
+std::shared_ptr<Input> Named(const std::string& name = "zuvnic1", bool force = false) {
     auto input = Input::New();
     input->SetParameter("interface-name", name);
     if (force) input->SetFlag("force");
@@ -78,14 +78,14 @@ struct Nic {
     std::string name;
     bool mesk, witness;
 };
-const std::string kCurrent = "vmk1 239.1.1.1 ff05::1 239.2.2.2 ff05::2 1000 2000 3000 9";
+const std::string kCurrent = "zuvnic1 239.1.1.1 ff05::1 239.2.2.2 ff05::2 1000 2000 3000 9";
 
 class NetworkTest : public HostTest {
   protected:
-    // Makes the in-use test answer for "vmk1".
+    // Makes the in-use test answer for "zuvnic1".
     void InUse(bool mesk, bool witness) {
-        ON_CALL(info, IsZuvNicInUse("vmk1", "mesk")).WillByDefault(Return(mesk));
-        ON_CALL(info, IsZuvNicInUse("vmk1", "witness")).WillByDefault(Return(witness));
+        ON_CALL(info, IsZuvNicInUse("zuvnic1", "mesk")).WillByDefault(Return(mesk));
+        ON_CALL(info, IsZuvNicInUse("zuvnic1", "witness")).WillByDefault(Return(witness));
     }
     // Makes GetZuvNicConfigs return records of these interfaces, afresh on every call.
     void Configured(std::vector<Nic> nics) {
@@ -119,9 +119,10 @@ TEST_F(NetworkTest, AddWithoutOptionsWritesTheDefaults) {
     EXPECT_CALL(info, GetZuvNicConfigs()).Times(0);
     CaptureWrite();
     ExpectSucceeded(*Run(*NetworkIpAdd::New(), Named()));
-    EXPECT_EQ(written,
-              "vmk1 224.2.3.4 FF19:0:0:0:0:2:3:4 224.1.2.3 FF19:0:0:0:0:1:2:3 23451 12345 12321 5 "
-              "mesk");
+    EXPECT_EQ(
+        written,
+        "zuvnic1 224.2.3.4 FF19:0:0:0:0:2:3:4 224.1.2.3 FF19:0:0:0:0:1:2:3 23451 12345 12321 5 "
+        "mesk");
     EXPECT_EQ(writtenOptions, "");
 }
 
@@ -137,32 +138,34 @@ TEST_F(NetworkTest, GivenValuesOverrideAddDefaultsAndSetCurrentValues) {
     input->SetParameterInt("host-uc-port", -7);
     input->SetParameterInt("multicast-ttl", 0);
     input->AddParameterValue("traffic-type", "witness");
-    Configured({{"vmk1", true, false}});
+    Configured({{"zuvnic1", true, false}});
     for (bool isSet : {false, true}) {
         SCOPED_TRACE(isSet ? "set" : "add");
         InUse(isSet, false);
         CaptureWrite();
         ExpectSucceeded(
             *(isSet ? Run(*NetworkIpSet::New(), input) : Run(*NetworkIpAdd::New(), input)));
-        EXPECT_EQ(written, "vmk1 224.9.9.1 ff02::9 224.9.9.2 ff02::a 2000 -1 -7 0 witness");
+        EXPECT_EQ(written, "zuvnic1 224.9.9.1 ff02::9 224.9.9.2 ff02::a 2000 -1 -7 0 witness");
     }
 }
 
 TEST_F(NetworkTest, SetKeepsEveryValueNotGivenOfTheExactlyNamedRecord) {
     // Near-miss names come first; of two records of the exact name the first counts.
-    Configured(
-        {{"VMK1", true, true}, {"vmk10", true, true}, {"vmk1", false, true}, {"vmk1", true, true}});
+    Configured({{"ZUVNIC1", true, true},
+                {"zuvnic10", true, true},
+                {"zuvnic1", false, true},
+                {"zuvnic1", true, true}});
     InUse(false, true);
     CaptureWrite();
     auto input = Named();
     input->SetParameterInt("agent-mc-port", 2001);
     ExpectSucceeded(*Run(*NetworkIpSet::New(), input));
-    EXPECT_EQ(written, "vmk1 239.1.1.1 ff05::1 239.2.2.2 ff05::2 2001 2000 3000 9 witness");
+    EXPECT_EQ(written, "zuvnic1 239.1.1.1 ff05::1 239.2.2.2 ff05::2 2001 2000 3000 9 witness");
 
     // An interface in use without a record of its name is not found; nothing is written.
-    EXPECT_CALL(info, IsZuvNicInUse("vmk7", "mesk")).WillOnce(Return(true));
+    EXPECT_CALL(info, IsZuvNicInUse("zuvnic7", "mesk")).WillOnce(Return(true));
     EXPECT_CALL(info, SetZuvNicConfig(_)).Times(0);
-    ExpectFailedWith(*Run(*NetworkIpSet::New(), Named("vmk7")),
+    ExpectFailedWith(*Run(*NetworkIpSet::New(), Named("zuvnic7")),
                      "This Zuvola network interface not found.");
 }
 
@@ -182,11 +185,11 @@ TEST_F(NetworkTest, InUseTestAsksWitnessOnlyWhenMeskSaysNo) {
         {true, false, false, notInUse},
         {true, true, false, ""},
     };
-    Configured({{"vmk1", true, false}});
+    Configured({{"zuvnic1", true, false}});
     for (const auto& c : cases) {
         SCOPED_TRACE(::testing::Message() << c.isSet << c.mesk << c.witness);
-        EXPECT_CALL(info, IsZuvNicInUse("vmk1", "mesk")).WillOnce(Return(c.mesk));
-        EXPECT_CALL(info, IsZuvNicInUse("vmk1", "witness"))
+        EXPECT_CALL(info, IsZuvNicInUse("zuvnic1", "mesk")).WillOnce(Return(c.mesk));
+        EXPECT_CALL(info, IsZuvNicInUse("zuvnic1", "witness"))
             .Times(c.mesk ? 0 : 1)
             .WillRepeatedly(Return(c.witness));
         // A refused command reads no record and writes nothing.
@@ -215,7 +218,7 @@ TEST_F(NetworkTest, TrafficTypesReplaceTheCurrentOnesOrFailOnAnUnknownOne) {
         {{"Mesk"}, "Unknown traffic type"},
     };
     // The current record carries both types, so a flag that is kept instead of replaced shows.
-    Configured({{"vmk1", true, true}});
+    Configured({{"zuvnic1", true, true}});
     InUse(true, true);
     for (const auto& c : cases) {
         SCOPED_TRACE(::testing::PrintToString(c.types));
@@ -252,7 +255,7 @@ TEST_F(NetworkTest, ListShowsEveryRecordFieldByFieldInTheLibrarysOrder) {
     EXPECT_CALL(info, GetZuvNicConfigs()).WillOnce([] {
         NicList list;
         list.push_back(
-            std::make_unique<MeskZuvNicConfig2>("vmk2", MeskIpAddress(Ipv4Address("224.2.3.4")),
+            std::make_unique<MeskZuvNicConfig2>("zuvnic2", MeskIpAddress(Ipv4Address("224.2.3.4")),
                                                 MeskIpAddress(Ipv6Address("FF19:0:0:0:0:2:3:4")),
                                                 MeskIpAddress(Ipv4Address("224.1.2.3")),
                                                 MeskIpAddress(Ipv6Address("FF19:0:0:0:0:1:2:3")),
@@ -260,7 +263,7 @@ TEST_F(NetworkTest, ListShowsEveryRecordFieldByFieldInTheLibrarysOrder) {
         list.back()->SetIfaceUuid("5e1c0d3a-0000-0000-0000-000000000002");
         // IPv6 groups in every slot, negative numbers, no traffic type.
         list.push_back(std::make_unique<MeskZuvNicConfig2>(
-            "vmk0", MeskIpAddress(Ipv6Address("ff05::1")), MeskIpAddress(Ipv6Address("ff05::2")),
+            "zuvnic0", MeskIpAddress(Ipv6Address("ff05::1")), MeskIpAddress(Ipv6Address("ff05::2")),
             MeskIpAddress(Ipv6Address("ff05::3")), MeskIpAddress(Ipv6Address("ff05::4")), -1,
             -2147483647 - 1, 0, -5, false, false, ""));
         return list;
@@ -277,10 +280,10 @@ TEST_F(NetworkTest, ListShowsEveryRecordFieldByFieldInTheLibrarysOrder) {
         rows.push_back(Row(entry));
     }
     EXPECT_THAT(
-        rows, ElementsAre(ElementsAre("vmk2", "IP", "5e1c0d3a-0000-0000-0000-000000000002",
+        rows, ElementsAre(ElementsAre("zuvnic2", "IP", "5e1c0d3a-0000-0000-0000-000000000002",
                                       "224.2.3.4", "FF19:0:0:0:0:2:3:4", "23451", "224.1.2.3",
                                       "FF19:0:0:0:0:1:2:3", "12345", "12321", "5", "mesk, witness"),
-                          ElementsAre("vmk0", "IP", "", "ff05::1", "ff05::2", "-1", "ff05::3",
+                          ElementsAre("zuvnic0", "IP", "", "ff05::1", "ff05::2", "-1", "ff05::3",
                                       "ff05::4", "-2147483648", "0", "-5", "")));
 }
 
@@ -303,11 +306,11 @@ TEST_F(NetworkTest, RemoveAsksForMeskThenWitnessAndStopsAtAFailure) {
             SCOPED_TRACE(command->GetDescription() + std::to_string(failing));
             const bool force = failing == kNone;
             InSequence order;
-            auto& mesk = EXPECT_CALL(info, RemoveZuvNic("vmk1", force, "mesk"));
-            auto& witness = EXPECT_CALL(info, RemoveZuvNic("vmk1", force, "witness"));
+            auto& mesk = EXPECT_CALL(info, RemoveZuvNic("zuvnic1", force, "mesk"));
+            auto& witness = EXPECT_CALL(info, RemoveZuvNic("zuvnic1", force, "witness"));
             if (failing == kMesk) mesk.WillOnce(Fail("busy")), witness.Times(0);
             if (failing == kWitness) witness.WillOnce(Fail("busy"));
-            auto output = Run(*command, Named("vmk1", force));
+            auto output = Run(*command, Named("zuvnic1", force));
             if (failing == kNone) {
                 ExpectSucceeded(*output);
             } else {

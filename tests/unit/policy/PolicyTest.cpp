@@ -102,18 +102,38 @@ TEST_F(PolicyTest, ResultAndCompletionAfterALibraryFailure) {
 
 // The command reference shows newlines as blanks, so the help's lines are checked here: the
 // sentence (M), then each option's explanation, which begins with its number (O), and its
-// default (D), with a note (N) between the two for the third option.
+// default (D), with a note (N) between the two for the third option. Each option opens with
+// "N)name - " and a sentence of its own.
 TEST(PolicyCommands, PolicyHelpPutsEachOptionAndDefaultOnALineOfItsOwn) {
     const std::string help =
         PolicySetDefault::New()->GetInputSpecInternal()->FindParameter("policy")->GetDescription();
+    const std::string sentence = "Mesk policy to set as default, in the form of a string.";
+    const std::vector<std::string> openings = {
+        "1)cacheReservation - Flash capacity reserved as read cache for the storage object. ",
+        "2)forceProvisioning - ",
+        "3)hostFailuresToTolerate - ",
+        "4)stripeWidth - ",
+        "5)proportionalCapacity - ",
+        "6)iopsLimit - ",
+        "7)replicaPreference - "};
     std::string kinds;
     size_t start = 0;
+    size_t option = 0;
     for (size_t end; (end = help.find('\n', start)) != std::string::npos; start = end + 1) {
-        kinds += std::isdigit(static_cast<unsigned char>(help[start])) ? 'O' : help[start];
+        const std::string line = help.substr(start, end - start);
+        if (!std::isdigit(static_cast<unsigned char>(line[0]))) {
+            kinds += line[0];
+            continue;
+        }
+        kinds += 'O';
+        ASSERT_LT(option, openings.size());
+        EXPECT_EQ(line.rfind(openings[option], 0), 0u) << line;
+        EXPECT_NE(line.find(". "), std::string::npos) << line;  // a sentence, then more
+        ++option;
     }
     EXPECT_EQ(kinds, "MODODONDODODODOD");
-    EXPECT_EQ(help.substr(0, help.find('\n')),
-              "Mesk policy to set as default, in the form of a string. Options are: ");
+    EXPECT_EQ(help.substr(0, help.find('\n')), sentence + " Options are: ");
+    EXPECT_EQ(help.size() - sentence.size(), 2656u);
     EXPECT_EQ(start, help.size());  // the last line ends in a newline
 }
 
