@@ -173,10 +173,12 @@ int Fail(const std::vector<std::string>& args) {
     }
     fault.op = args[0];
     fault.message = args[1];
-    const auto& names = SimHost::OperationNames();
-    if (std::find(names.begin(), names.end(), fault.op) == names.end()) {
+    HostCtlSim::Operation operation;
+    if (!HostCtlSim::FindOperation(fault.op, &operation)) {
         std::string known;
-        for (const auto& name : names) known += (known.empty() ? "" : ", ") + name;
+        for (const char* name : HostCtlSim::kOperationNames) {
+            known += (known.empty() ? "" : ", ") + std::string(name);
+        }
         throw UsageError("unknown operation '" + fault.op + "'; the operations are: " + known);
     }
     host.Open().SetFault(fault);

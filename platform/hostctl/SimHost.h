@@ -6,7 +6,6 @@
 // consults the injected failures, so that any call can be made to throw.
 #pragma once
 
-#include <map>
 #include <memory>
 #include <set>
 #include <string>
@@ -14,6 +13,7 @@
 
 #include "HostBackend.h"
 #include "HostRoot.h"
+#include "Operations.h"
 #include "StateDocument.h"
 #include "StateStore.h"
 
@@ -34,8 +34,6 @@ class SimHost : public HostBackend {
     static Options OptionsFromEnvironment();
     // The process's simulated host, made on first use from the environment.
     static SimHost& Default();
-    // Every operation name that the call log and the injected failures use.
-    static const std::vector<std::string>& OperationNames();
 
     explicit SimHost(Options options);
     // Writes what is left of the call log.
@@ -45,6 +43,7 @@ class SimHost : public HostBackend {
     StateStore& Store();
     const HostRoot& Root() const { return root_; }
 
+    // The static entry points, answered by the file of their area (Operations.h).
     std::unique_ptr<HostCtl::MeskPlugin> GetMeskPlugin() override;
     void GetMeskDisks(std::vector<std::shared_ptr<HostCtl::Mesk::MeskDiskLun>>& luns) override;
     void GetInfoFromKOVRA(std::vector<HostCtl::Mesk::MeskMemberInfo>& members,
@@ -71,7 +70,7 @@ class SimHost : public HostBackend {
     char* UUID_PackText(const char* text, char* buffer, size_t length) override;
 
     // Records the call of `op`, then throws the failure injected for it, if any.
-    void Enter(const char* op, Json args);
+    void Enter(Operation op, Json args);
     // Notes on the call being served that it threw.
     void NoteError(const std::string& message);
     // Runs `change` in one transaction, together with the call log so far.
@@ -100,12 +99,12 @@ class SimHost : public HostBackend {
     std::unique_ptr<StateStore> store_;
     std::string invocation_;
     std::vector<Fault> faults_;
-    std::map<std::string, int64_t> callCounts_;
+    int64_t callCounts_[kOperationCount] = {};  // calls of each operation so far
     // A call not yet written to the log. Its entry text is made only when it is written, so
     // that a listing of thousands of disks does not build a JSON object for each call.
     struct PendingCall {
         int64_t time;  // nanoseconds since the epoch
-        std::string op;
+        Operation op;
         Json args;
         bool failed = false;
         std::string error;
@@ -117,7 +116,7 @@ class SimHost : public HostBackend {
 // Runs `body` as the operation `op` of `host`: recorded, subject to injected failures, and
 // noted in the log when it throws.
 template <class Body>
-auto Serve(SimHost& host, const char* op, Json args, Body&& body) -> decltype(body()) {
+auto Serve(SimHost& host, Operation op, Json args, Body&& body) -> decltype(body()) {
     try {
         host.Enter(op, std::move(args));
         return body();

@@ -2,9 +2,13 @@
 // failures and the call log.
 #include <sys/stat.h>
 
+#include <fstream>
 #include <functional>
+#include <map>
+#include <regex>
 
 #include "HostRoot.h"
+#include "Operations.h"
 #include "SimFixture.h"
 #include "StateDocument.h"
 #include "hostctl/MeskUtil.h"
@@ -116,6 +120,31 @@ TEST_F(SimState, CallLogHoldsTheLastInvocationsCallsInOrder) {
     MeskUtil::IsWitnessNode();
     NewInvocation();
     EXPECT_EQ(LoggedCalls(*host_), std::vector<Json>{J(R"({"op":"IsWitnessNode","args":[]})")});
+}
+
+// The guide's list of operation names is the one a maintainer reads: every operation of the
+// table, each once, and nothing else.
+TEST(Operations, GuideListsEveryOperationOnce) {
+    std::ifstream guide(MESK_SOURCE_DIR "/docs/hostsim.md");
+    ASSERT_TRUE(guide) << "cannot read docs/hostsim.md";
+    std::map<std::string, int> listed;
+    std::string line;
+    bool inList = false;
+    const std::regex name("`([A-Za-z_0-9]+)`");
+    while (std::getline(guide, line)) {
+        if (line.rfind('#', 0) == 0) inList = line == "### Operation names";
+        if (!inList || (line.rfind("- ", 0) != 0 && line.rfind("  ", 0) != 0)) continue;
+        for (std::sregex_iterator it(line.begin(), line.end(), name), end; it != end; ++it) {
+            ++listed[(*it)[1]];
+        }
+    }
+    std::string wrong;
+    for (const char* operation : HostCtlSim::kOperationNames) {
+        if (listed[operation] != 1) wrong += std::string(" ") + operation;
+        listed.erase(operation);
+    }
+    for (const auto& unknown : listed) wrong += " " + unknown.first + "(not an operation)";
+    EXPECT_EQ(wrong, "") << "operations not listed once in docs/hostsim.md";
 }
 
 }  // namespace

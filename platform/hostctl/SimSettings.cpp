@@ -1,0 +1,134 @@
+// The simulated host's answers about its settings: datastore, fault domain, maintenance mode,
+// default policies and resync.
+#include "SimInfo.h"
+
+namespace HostCtlSim {
+
+std::string SimInfo::GetDatastoreName() {
+    return Serve(host_, Operation::GetDatastoreName, Json::array(), [&] {
+        return Store().ReadSection("settings")["datastoreName"].get<std::string>();
+    });
+}
+
+void SimInfo::SetDatastoreName(const std::string& name) {
+    Serve(host_, Operation::SetDatastoreName, Json::array({name}), [&] {
+        if (name.empty()) Refuse("The datastore name cannot be empty");
+        SetValue("settings", "datastoreName", name);
+    });
+}
+
+std::string SimInfo::GetFaultDomainName() {
+    return Serve(host_, Operation::GetFaultDomainName, Json::array(), [&] {
+        return Store().ReadSection("settings")["faultDomainName"].get<std::string>();
+    });
+}
+
+void SimInfo::SetFaultDomainName(const std::string& name) {
+    Serve(host_, Operation::SetFaultDomainName, Json::array({name}), [&] {
+        if (name.empty()) Refuse("The fault domain name cannot be empty");
+        host_.Modify([&](StateStore& store) {
+            Json settings = store.ReadSection("settings");
+            if (settings["faultDomainName"] != name || settings["faultDomainId"] == "") {
+                settings["faultDomainName"] = name;
+                settings["faultDomainId"] = NewUuid();
+            }
+            store.WriteSection("settings", settings);
+        });
+    });
+}
+
+void SimInfo::ResetFaultDomainName() {
+    Serve(host_, Operation::ResetFaultDomainName, Json::array(), [&] {
+        host_.Modify([&](StateStore& store) {
+            Json settings = store.ReadSection("settings");
+            settings["faultDomainName"] = "";
+            settings["faultDomainId"] = "";
+            store.WriteSection("settings", settings);
+        });
+    });
+}
+
+std::string SimInfo::GetDefaultPolicy(const std::string& policyClass) {
+    return Serve(host_, Operation::GetDefaultPolicy, Json::array({policyClass}), [&] {
+        Json policies = Store().ReadSection("policies");
+        if (!policies.contains(policyClass)) {
+            Refuse("Unknown policy class: " + Quoted(policyClass));
+        }
+        return policies[policyClass].get<std::string>();
+    });
+}
+
+void SimInfo::SetDefaultPolicy(const std::string& policyClass, const std::string& policy) {
+    Serve(host_, Operation::SetDefaultPolicy, Json::array({policyClass, policy}), [&] {
+        if (policy.empty()) Refuse("The policy cannot be empty");
+        host_.Modify([&](StateStore& store) {
+            Json policies = store.ReadSection("policies");
+            if (!policies.contains(policyClass)) {
+                Refuse("Unknown policy class: " + Quoted(policyClass));
+            }
+            policies[policyClass] = policy;
+            store.WriteSection("policies", policies);
+        });
+    });
+}
+
+void SimInfo::ClearDefaultPolicies() {
+    Serve(host_, Operation::ClearDefaultPolicies, Json::array(), [&] {
+        host_.Modify([&](StateStore& store) {
+            Json policies = store.ReadSection("policies");
+            for (auto& value : policies) value = "";
+            store.WriteSection("policies", policies);
+        });
+    });
+}
+
+int64_t SimInfo::GetResyncBandwidth() {
+    return Serve(host_, Operation::GetResyncBandwidth, Json::array(),
+                 [&] { return Store().ReadSection("resync")["bandwidth"].get<int64_t>(); });
+}
+
+int64_t SimInfo::GetResyncThrottle() {
+    return Serve(host_, Operation::GetResyncThrottle, Json::array(),
+                 [&] { return Store().ReadSection("resync")["throttle"].get<int64_t>(); });
+}
+
+void SimInfo::SetResyncThrottle(int64_t level) {
+    Serve(host_, Operation::SetResyncThrottle, Json::array({level}), [&] {
+        if (level < 0) Refuse("Invalid resync throttle level: " + std::to_string(level));
+        SetValue("resync", "throttle", level);
+    });
+}
+
+std::string SimHost::GetFaultDomainId() {
+    return Serve(*this, Operation::GetFaultDomainId, Json::array(), [&] {
+        return Store().ReadSection("settings")["faultDomainId"].get<std::string>();
+    });
+}
+
+void SimHost::DecomCancel() {
+    // Cancelling when no operation is in progress succeeds too.
+    Serve(*this, Operation::DecomCancel, Json::array(), [&] {
+        Modify([&](StateStore& store) {
+            Json settings = store.ReadSection("settings");
+            settings["maintenanceOperation"] = "";
+            store.WriteSection("settings", settings);
+        });
+    });
+}
+
+MeskPolicyClass SimHost::StringToMeskPolicyClass(const std::string& name) {
+    return Serve(*this, Operation::StringToMeskPolicyClass, Json::array({name}),
+                 [&] { return HostBackend::StringToMeskPolicyClass(name); });
+}
+
+std::string SimHost::MeskPolicyClassToString(MeskPolicyClass policyClass) {
+    return Serve(*this, Operation::MeskPolicyClassToString, Json::array({int32_t(policyClass)}),
+                 [&] { return HostBackend::MeskPolicyClassToString(policyClass); });
+}
+
+std::vector<MeskPolicyClass> SimHost::GetMeskPolicyClasses() {
+    return Serve(*this, Operation::GetMeskPolicyClasses, Json::array(),
+                 [&] { return HostBackend::GetMeskPolicyClasses(); });
+}
+
+}  // namespace HostCtlSim
