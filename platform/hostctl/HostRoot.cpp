@@ -194,9 +194,9 @@ void HostRoot::WriteServices(const Json& services) const {
     WriteFile(kServiceStatePath, text.str(), false);
 }
 
-std::vector<CallRecord> HostRoot::ReadScriptLog() const {
+std::vector<CallRecord> ParseTimedLog(const std::string& text) {
     std::vector<CallRecord> records;
-    std::ifstream in(PathOf(kScriptLogPath));
+    std::istringstream in(text);
     std::string line;
     while (std::getline(in, line)) {
         Json entry = Json::parse(line, nullptr, false);
@@ -211,6 +211,13 @@ std::vector<CallRecord> HostRoot::ReadScriptLog() const {
         records.push_back(std::move(record));
     }
     return records;
+}
+
+std::vector<CallRecord> HostRoot::ReadScriptLog() const {
+    std::ifstream in(PathOf(kScriptLogPath));
+    std::ostringstream text;
+    text << in.rdbuf();
+    return ParseTimedLog(text.str());
 }
 
 void HostRoot::ClearScriptLog() const {

@@ -3,13 +3,23 @@
 // script, the service's simulated state and the log in which both scripts record their runs.
 #pragma once
 
+#include <cstdint>
 #include <string>
 #include <vector>
 
 #include "StateDocument.h"
-#include "StateStore.h"
 
 namespace HostCtlSim {
+
+// One line of a log of calls: the call log's or the scripts' runs.
+struct CallRecord {
+    int64_t time = 0;   // nanoseconds since the epoch
+    std::string entry;  // the line without its time: {"op": name, "args": [...], ...}
+};
+
+// The lines of such a log, each {"time": ..., ...}, in their order; lines that are not JSON
+// are skipped.
+std::vector<CallRecord> ParseTimedLog(const std::string& text);
 
 // Absolute paths on the host.
 extern const char* const kTraceConfigPath;   // /etc/orvane/mesk/mesktraced.conf

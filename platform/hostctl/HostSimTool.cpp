@@ -10,6 +10,7 @@
 #include <string>
 #include <vector>
 
+#include "CallLog.h"
 #include "HostRoot.h"
 #include "SimHost.h"
 #include "StateDocument.h"
@@ -92,16 +93,14 @@ struct Host {
     // Replaces the whole host by a normalized document; `fresh` also renews the host's files
     // and forgets the injected failures and the call log.
     void Replace(const Json& document, bool fresh) {
-        Open();
+        if (store.OpenForReplacement()) root.Create(HostCtlSim::DefaultHost()["services"]);
         StateStore::Transaction transaction(store);
         store.Replace(document);
-        if (fresh) {
-            store.ClearFaults();
-            store.ClearCalls();
-        }
+        if (fresh) store.ClearFaults();
         transaction.Commit();
         if (fresh) {
             root.Create(document["services"]);
+            HostCtlSim::CallLog::Clear(root);
         } else {
             root.WriteServices(document["services"]);
         }
@@ -150,7 +149,9 @@ int Load(const std::vector<std::string>& args) {
 int Fail(const std::vector<std::string>& args) {
     Host host;
     if (args.size() == 1 && args[0] == "--clear") {
-        host.Open().ClearFaults();
+        StateStore::Transaction transaction(host.Open());
+        host.store.ClearFaults();
+        transaction.Commit();
         return 0;
     }
     if (args.size() == 1 && args[0] == "--list") {
@@ -181,20 +182,24 @@ int Fail(const std::vector<std::string>& args) {
         }
         throw UsageError("unknown operation '" + fault.op + "'; the operations are: " + known);
     }
-    host.Open().SetFault(fault);
+    StateStore::Transaction transaction(host.Open());
+    host.store.SetFault(fault);
+    transaction.Commit();
     return 0;
 }
 
 int Calls(const std::vector<std::string>& args) {
-    Host host;
+    HostRoot root(SimHost::OptionsFromEnvironment().hostRoot);
     if (args.size() == 1 && args[0] == "--clear") {
-        host.Open().ClearCalls();
-        host.root.ClearScriptLog();
+        if (!HostCtlSim::CallLog::Clear(root)) {
+            throw std::runtime_error("cannot clear " + root.PathOf(HostCtlSim::kCallLogPath));
+        }
+        root.ClearScriptLog();
         return 0;
     }
     if (!args.empty()) throw UsageError("calls takes no argument but --clear");
-    std::vector<CallRecord> calls = host.Open().ReadCalls();
-    std::vector<CallRecord> scripts = host.root.ReadScriptLog();
+    std::vector<CallRecord> calls = HostCtlSim::CallLog::Read(root);
+    std::vector<CallRecord> scripts = root.ReadScriptLog();
     // Script runs of earlier invocations are left out.
     int64_t since = calls.empty() ? INT64_MIN : calls.front().time;
     size_t s = 0;

@@ -1,6 +1,5 @@
 #include "SimHost.h"
 
-#include <unistd.h>
 #include <uuid/uuid.h>
 
 #include <cstdlib>
@@ -80,18 +79,10 @@ SimHost& SimHost::Default() {
     return host;
 }
 
-SimHost::SimHost(Options options)
-    : options_(std::move(options)),
-      root_(options_.hostRoot),
-      invocation_(std::to_string(getpid()) + "-" + std::to_string(NowNanoseconds()) + "-" +
-                  std::to_string(reinterpret_cast<uintptr_t>(this))) {}
+SimHost::SimHost(Options options) : options_(std::move(options)), root_(options_.hostRoot) {}
 
 SimHost::~SimHost() {
-    try {
-        Flush();
-    } catch (...) {
-        // The state is gone or locked for too long; the log of this invocation is lost.
-    }
+    log_.Write(root_);
 }
 
 StateStore& SimHost::Store() {
@@ -111,7 +102,7 @@ StateStore& SimHost::Store() {
 
 void SimHost::Enter(Operation op, Json args) {
     Store();
-    pending_.push_back(PendingCall{NowNanoseconds(), op, std::move(args), false, std::string()});
+    log_.Record(op, std::move(args));
     int64_t count = ++callCounts_[static_cast<size_t>(op)];
     for (const Fault& fault : faults_) {
         if (fault.op == OperationName(op) && (fault.call == 0 || fault.call == count)) {
@@ -121,32 +112,7 @@ void SimHost::Enter(Operation op, Json args) {
 }
 
 void SimHost::NoteError(const std::string& message) {
-    if (pending_.empty()) return;
-    pending_.back().failed = true;
-    pending_.back().error = message;
-}
-
-std::vector<CallRecord> SimHost::Pending() const {
-    std::vector<CallRecord> calls;
-    calls.reserve(pending_.size());
-    // The text of {"op": ..., "args": [...], "error": ...}, written out in that key order.
-    // Operation names are plain identifiers (Operations.h) and need no escaping.
-    for (const auto& call : pending_) {
-        std::string entry = std::string("{\"op\":\"") + OperationName(call.op) +
-                            "\",\"args\":" + JsonText(call.args);
-        if (call.failed) entry += ",\"error\":" + JsonText(call.error);
-        entry += '}';
-        calls.push_back(CallRecord{call.time, std::move(entry)});
-    }
-    return calls;
-}
-
-void SimHost::Flush() {
-    if (pending_.empty() || !store_) return;
-    StateStore::Transaction transaction(*store_);
-    store_->AppendCalls(invocation_, Pending());
-    transaction.Commit();
-    pending_.clear();
+    log_.NoteError(message);
 }
 
 std::unique_ptr<HostCtl::MeskPlugin> SimHost::GetMeskPlugin() {

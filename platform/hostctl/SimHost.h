@@ -3,7 +3,8 @@
 // Its state lives in a StateStore (opened on the first call that needs it) and its files in
 // a HostRoot. Every host-control operation it serves is recorded, with its arguments, in the
 // call log of the current invocation (one SimHost object is one invocation) and first
-// consults the injected failures, so that any call can be made to throw.
+// consults the injected failures, so that any call can be made to throw. The answers of each
+// area are in the area's file (Operations.h lists them).
 #pragma once
 
 #include <memory>
@@ -11,6 +12,7 @@
 #include <string>
 #include <vector>
 
+#include "CallLog.h"
 #include "HostBackend.h"
 #include "HostRoot.h"
 #include "Operations.h"
@@ -36,7 +38,7 @@ class SimHost : public HostBackend {
     static SimHost& Default();
 
     explicit SimHost(Options options);
-    // Writes what is left of the call log.
+    // Writes the call log.
     ~SimHost() override;
 
     // The state, opened (a missing database is made a fresh host, with its files).
@@ -73,18 +75,14 @@ class SimHost : public HostBackend {
     void Enter(Operation op, Json args);
     // Notes on the call being served that it threw.
     void NoteError(const std::string& message);
-    // Runs `change` in one transaction, together with the call log so far.
+    // Runs `change` in one transaction.
     template <class Change>
     void Modify(Change&& change) {
         StateStore& store = Store();
         StateStore::Transaction transaction(store);
         change(store);
-        store.AppendCalls(invocation_, Pending());
         transaction.Commit();
-        pending_.clear();
     }
-    // Writes the calls recorded so far to the call log.
-    void Flush();
     // Interfaces whose last traffic type this process removed.
     bool RemovedInThisInvocation(const std::string& name) const {
         return removedInterfaces_.count(name) != 0;
@@ -92,24 +90,12 @@ class SimHost : public HostBackend {
     void NoteRemoved(const std::string& name) { removedInterfaces_.insert(name); }
 
   private:
-    std::vector<CallRecord> Pending() const;
-
     Options options_;
     HostRoot root_;
     std::unique_ptr<StateStore> store_;
-    std::string invocation_;
     std::vector<Fault> faults_;
     int64_t callCounts_[kOperationCount] = {};  // calls of each operation so far
-    // A call not yet written to the log. Its entry text is made only when it is written, so
-    // that a listing of thousands of disks does not build a JSON object for each call.
-    struct PendingCall {
-        int64_t time;  // nanoseconds since the epoch
-        Operation op;
-        Json args;
-        bool failed = false;
-        std::string error;
-    };
-    std::vector<PendingCall> pending_;
+    CallLog log_;
     std::set<std::string> removedInterfaces_;
 };
 

@@ -7,41 +7,47 @@ namespace {
 
 const size_t kMaxCapacityDisks = 7;
 
-bool IsFronting(const Json& disk) {
-    return disk["diskGroupUuid"] == disk["uuid"];
+bool IsFronting(const Disk& disk) {
+    return disk.diskGroupUuid == disk.uuid;
 }
-bool IsGrouped(const Json& disk) {
-    return !disk["diskGroupUuid"].get<std::string>().empty();
-}
-std::string NameOf(const Json& disk) {
-    return disk["name"].get<std::string>();
+bool IsGrouped(const Disk& disk) {
+    return !disk.diskGroupUuid.empty();
 }
 
-Json DeviceNamed(StateStore& store, const std::string& name) {
-    Json disk;
-    if (!store.ReadDiskByName(name, disk)) Refuse("Unknown disk: " + Quoted(name));
-    return disk;
+Disk DeviceNamed(StateStore& store, const std::string& name) {
+    const Disk* disk = store.FindDevice(name);
+    if (disk == nullptr) Refuse("Unknown disk: " + Quoted(name));
+    return *disk;
 }
 
-Json DiskWithUuid(StateStore& store, const std::string& text) {
+Disk DiskWithUuid(StateStore& store, const std::string& text) {
     if (!IsUuidText(text)) Refuse("Invalid UUID: " + Quoted(text));
-    Json disk;
-    if (!store.ReadDisk(LowerCase(text), disk)) Refuse("No Mesk disk with UUID " + text);
-    return disk;
+    const Disk* disk = store.FindDisk(LowerCase(text));
+    if (disk == nullptr) Refuse("No Mesk disk with UUID " + text);
+    return *disk;
 }
 
-Json GroupedDisk(StateStore& store, const std::string& name) {
-    Json disk = DeviceNamed(store, name);
+Disk GroupedDisk(StateStore& store, const std::string& name) {
+    Disk disk = DeviceNamed(store, name);
     if (!IsGrouped(disk)) Refuse("Disk " + Quoted(name) + " is not in use by Mesk");
     return disk;
 }
 
-Json FrontingSsd(StateStore& store, const std::string& name) {
-    Json disk = GroupedDisk(store, name);
+Disk FrontingSsd(StateStore& store, const std::string& name) {
+    Disk disk = GroupedDisk(store, name);
     if (!IsFronting(disk)) {
         Refuse("Disk " + Quoted(name) + " is not the fronting SSD of a disk group");
     }
     return disk;
+}
+
+// The disks of the group that `ssd` fronts, the SSD included, in inventory order.
+std::vector<Disk> GroupOf(StateStore& store, const Disk& ssd) {
+    std::vector<Disk> group;
+    for (const Disk& disk : store.Disks()) {
+        if (disk.diskGroupUuid == ssd.diskGroupUuid) group.push_back(disk);
+    }
+    return group;
 }
 
 void CheckEvacuationMode(const std::string& mode) {
@@ -53,148 +59,53 @@ void CheckEvacuationMode(const std::string& mode) {
 }
 
 // Gives the disk back to the host; a disk that the host has no device for is forgotten.
-void Release(StateStore& store, Json disk) {
-    if (!disk["lun"].get<bool>()) {
-        store.DeleteDisk(disk["uuid"]);
+void Release(StateStore& store, const Disk& disk) {
+    if (!disk.lun) {
+        store.DeleteDisk(disk.uuid);
         return;
     }
-    disk["diskGroupUuid"] = "";
-    disk["diskGroupName"] = "";
-    disk["usedByThisHost"] = false;
-    disk["inKovra"] = false;
-    disk["formatVersion"] = 0;
-    disk["deduplication"] = false;
-    disk["checksum"] = "";
-    disk["checksumOk"] = false;
-    disk["isCapacityTier"] = false;
-    disk["encryption"] = false;
-    disk["diskKeyLoaded"] = false;
-    disk["mounted"] = false;
-    store.UpdateDisk(disk);
+    Disk released;
+    released.name = disk.name;
+    released.uuid = disk.uuid;
+    released.isSsd = disk.isSsd;
+    released.capacityBytes = disk.capacityBytes;
+    released.capacityFlashTag = disk.capacityFlashTag;
+    store.WriteDisk(released);
 }
 
-void Claim(Json& disk, const std::string& groupUuid, const std::string& groupName,
+void Claim(Disk& disk, const std::string& groupUuid, const std::string& groupName,
            bool capacityTier) {
-    disk["diskGroupUuid"] = groupUuid;
-    disk["diskGroupName"] = groupName;
-    disk["usedByThisHost"] = true;
-    disk["inKovra"] = true;
-    disk["formatVersion"] = 5;
-    disk["checksum"] = "0";
-    disk["checksumOk"] = true;
-    disk["isCapacityTier"] = capacityTier;
-    disk["mounted"] = true;
+    disk.diskGroupUuid = groupUuid;
+    disk.diskGroupName = groupName;
+    disk.usedByThisHost = true;
+    disk.inKovra = true;
+    disk.formatVersion = 5;
+    disk.checksum = "0";
+    disk.checksumOk = true;
+    disk.isCapacityTier = capacityTier;
+    disk.mounted = true;
 }
 
-void ReleaseDisk(StateStore& store, const Json& disk) {
+void ReleaseDisk(StateStore& store, const Disk& disk) {
     if (IsFronting(disk)) {
-        Refuse("Disk " + Quoted(NameOf(disk)) +
+        Refuse("Disk " + Quoted(disk.name) +
                " is the fronting SSD of a disk group; remove the disk group instead");
     }
     Release(store, disk);
 }
 
-void ReleaseGroup(StateStore& store, const Json& ssd) {
-    for (const Json& disk : store.ReadDiskGroup(ssd["diskGroupUuid"])) Release(store, disk);
+void ReleaseGroup(StateStore& store, const Disk& ssd) {
+    for (const Disk& disk : GroupOf(store, ssd)) Release(store, disk);
 }
 
-void SetMounted(StateStore& store, Json disk, bool mounted) {
-    disk["mounted"] = mounted;
-    store.UpdateDisk(disk);
+void SetMounted(StateStore& store, Disk disk, bool mounted) {
+    disk.mounted = mounted;
+    store.WriteDisk(disk);
 }
 
-void SetGroupMounted(StateStore& store, const Json& ssd, bool mounted) {
-    for (const Json& disk : store.ReadDiskGroup(ssd["diskGroupUuid"])) {
-        SetMounted(store, disk, mounted);
-    }
+void SetGroupMounted(StateStore& store, const Disk& ssd, bool mounted) {
+    for (const Disk& disk : GroupOf(store, ssd)) SetMounted(store, disk, mounted);
 }
-
-// Fills a disk information record straight from a disk's stored JSON text, without building
-// a document: a listing reads thousands of records, and a document's allocations cost more
-// than the parse itself. Only the record's own top-level keys are read.
-class DiskInfoReader : public nlohmann::json_sax<Json> {
-  public:
-    explicit DiskInfoReader(MeskDiskInfo& info) : info_(info) {}
-
-    bool key(string_t& key) override {
-        if (depth_ == 1) key_.swap(key);
-        return true;
-    }
-    bool string(string_t& value) override {
-        if (depth_ != 1) return true;
-        if (key_ == "name") {
-            info_.name.swap(value);
-        } else if (key_ == "uuid") {
-            info_.meskUuid.swap(value);
-        } else if (key_ == "diskGroupUuid") {
-            info_.diskGroupUuid.swap(value);
-        } else if (key_ == "diskGroupName") {
-            info_.diskGroupName.swap(value);
-        } else if (key_ == "checksum") {
-            info_.checksum.swap(value);
-        }
-        return true;
-    }
-    bool boolean(bool value) override {
-        if (depth_ != 1) return true;
-        static const std::pair<const char*, bool MeskDiskInfo::*> kFlags[] = {
-            {"isSsd", &MeskDiskInfo::isSsd},
-            {"usedByThisHost", &MeskDiskInfo::usedByThisHost},
-            {"inKovra", &MeskDiskInfo::inKovra},
-            {"deduplication", &MeskDiskInfo::deduplication},
-            {"checksumOk", &MeskDiskInfo::checksumOk},
-            {"isCapacityTier", &MeskDiskInfo::isCapacityTier},
-            {"encryption", &MeskDiskInfo::encryption},
-            {"diskKeyLoaded", &MeskDiskInfo::diskKeyLoaded},
-            {"mounted", &MeskDiskInfo::isMounted},
-            {"capacityFlashTag", &MeskDiskInfo::capacityFlashTag},
-        };
-        for (const auto& flag : kFlags) {
-            if (key_ == flag.first) {
-                info_.*flag.second = value;
-                break;
-            }
-        }
-        return true;
-    }
-    bool number_integer(number_integer_t value) override {
-        if (depth_ == 1 && key_ == "formatVersion") info_.formatVersion = int32_t(value);
-        return true;
-    }
-    bool number_unsigned(number_unsigned_t value) override {
-        if (depth_ != 1) return true;
-        if (key_ == "formatVersion") info_.formatVersion = int32_t(value);
-        if (key_ == "capacityBytes") info_.capacityBytes = value;
-        return true;
-    }
-    bool number_float(number_float_t, const string_t&) override { return true; }
-    bool null() override { return true; }
-    bool binary(binary_t&) override { return true; }
-    bool start_object(std::size_t) override {
-        ++depth_;
-        return true;
-    }
-    bool end_object() override {
-        --depth_;
-        return true;
-    }
-    bool start_array(std::size_t) override {
-        ++depth_;
-        return true;
-    }
-    bool end_array() override {
-        --depth_;
-        return true;
-    }
-    bool parse_error(std::size_t, const std::string&, const nlohmann::detail::exception&) override {
-        return false;
-    }
-
-  private:
-    MeskDiskInfo& info_;
-    int depth_ = 0;
-    std::string key_;
-};
 
 class SimLun : public MeskDiskLun {
   public:
@@ -209,14 +120,14 @@ class SimLun : public MeskDiskLun {
 
 void Tag(SimHost& host, const std::string& name, bool tagged) {
     host.Modify([&](StateStore& store) {
-        Json disk = DeviceNamed(store, name);
-        if (!disk["isSsd"].get<bool>()) {
+        Disk disk = DeviceNamed(store, name);
+        if (!disk.isSsd) {
             Refuse("Disk " + Quoted(name) + " is not an SSD; only an SSD can be tagged " +
                    "for capacity flash");
         }
         if (IsGrouped(disk)) Refuse("Disk " + Quoted(name) + " is in use by Mesk");
-        disk["capacityFlashTag"] = tagged;
-        store.UpdateDisk(disk);
+        disk.capacityFlashTag = tagged;
+        store.WriteDisk(disk);
     });
 }
 
@@ -225,8 +136,8 @@ void Tag(SimHost& host, const std::string& name, bool tagged) {
 void SimInfo::GetMeskDiskUuids(std::vector<Uuid>& uuids) {
     Serve(host_, Operation::GetMeskDiskUuids, Json::array(), [&] {
         uuids.clear();
-        for (const std::string& text : Store().ReadGroupedDiskUuids()) {
-            uuids.push_back(host_.HostBackend::StringToMeskUuid(text));
+        for (const Disk& disk : Store().Disks()) {
+            if (IsGrouped(disk)) uuids.push_back(host_.HostBackend::StringToMeskUuid(disk.uuid));
         }
     });
 }
@@ -235,47 +146,58 @@ void SimInfo::GetDiskInfo(const Uuid& uuid, const std::vector<std::shared_ptr<Me
                           MeskDiskInfo& info) {
     std::string text = host_.HostBackend::MeskUuidToString(uuid);
     Serve(host_, Operation::GetDiskInfo, Json::array({text, luns.size()}), [&] {
-        std::string record;
-        if (!Store().ReadDiskRecord(text, record)) Refuse("No Mesk disk with UUID " + text);
-        DiskInfoReader reader(info);
-        if (!Json::sax_parse(record, &reader)) {
-            // Not JSON: reading it as a document throws the parser's own error.
-            Json document = Json::parse(record);
-            static_cast<void>(document);
-        }
+        const Disk* disk = Store().FindDisk(text);
+        if (disk == nullptr) Refuse("No Mesk disk with UUID " + text);
+        info.name = disk->name;
+        info.isSsd = disk->isSsd;
+        info.meskUuid = disk->uuid;
+        info.diskGroupUuid = disk->diskGroupUuid;
+        info.diskGroupName = disk->diskGroupName;
+        info.usedByThisHost = disk->usedByThisHost;
+        info.inKovra = disk->inKovra;
+        info.formatVersion = static_cast<int32_t>(disk->formatVersion);
+        info.deduplication = disk->deduplication;
+        info.checksum = disk->checksum;
+        info.checksumOk = disk->checksumOk;
+        info.isCapacityTier = disk->isCapacityTier;
+        info.encryption = disk->encryption;
+        info.diskKeyLoaded = disk->diskKeyLoaded;
+        info.capacityBytes = disk->capacityBytes;
+        info.isMounted = disk->mounted;
+        info.capacityFlashTag = disk->capacityFlashTag;
     });
 }
 
 void SimInfo::AddDisks(const std::string& ssd, const std::vector<std::string>& disks) {
     Serve(host_, Operation::AddDisks, Json::array({ssd, disks}), [&] {
         host_.Modify([&](StateStore& store) {
-            Json cache = DeviceNamed(store, ssd);
-            if (!cache["isSsd"].get<bool>()) Refuse("Disk " + Quoted(ssd) + " is not an SSD");
+            Disk cache = DeviceNamed(store, ssd);
+            if (!cache.isSsd) Refuse("Disk " + Quoted(ssd) + " is not an SSD");
             if (disks.empty()) Refuse("No capacity disk given for the disk group");
             size_t members = 0;
             if (IsGrouped(cache)) {
                 if (!IsFronting(cache)) {
                     Refuse("Disk " + Quoted(ssd) + " is a capacity disk of a disk group");
                 }
-                members = store.ReadDiskGroup(cache["uuid"]).size() - 1;
+                members = GroupOf(store, cache).size() - 1;
             } else {
-                Claim(cache, cache["uuid"], ssd, false);
-                store.UpdateDisk(cache);
+                Claim(cache, cache.uuid, ssd, false);
+                store.WriteDisk(cache);
             }
             if (members + disks.size() > kMaxCapacityDisks) {
                 Refuse("A disk group holds at most " + std::to_string(kMaxCapacityDisks) +
                        " capacity disks");
             }
             for (const std::string& name : disks) {
-                Json disk = DeviceNamed(store, name);
+                Disk disk = DeviceNamed(store, name);
                 if (IsGrouped(disk)) Refuse("Disk " + Quoted(name) + " is already in use by Mesk");
-                if (disk["isSsd"].get<bool>() && !disk["capacityFlashTag"].get<bool>()) {
+                if (disk.isSsd && !disk.capacityFlashTag) {
                     Refuse("Disk " + Quoted(name) +
                            " is an SSD without the capacityFlash tag and cannot be a "
                            "capacity disk");
                 }
-                Claim(disk, cache["uuid"], cache["diskGroupName"], true);
-                store.UpdateDisk(disk);
+                Claim(disk, cache.uuid, cache.diskGroupName, true);
+                store.WriteDisk(disk);
             }
         });
     });
@@ -299,7 +221,7 @@ void SimInfo::RemoveDiskByUuid(const std::string& uuid, const std::string& evacu
     Serve(host_, Operation::RemoveDiskByUuid, Json::array({uuid, evacuationMode}), [&] {
         CheckEvacuationMode(evacuationMode);
         host_.Modify([&](StateStore& store) {
-            Json disk = DiskWithUuid(store, uuid);
+            Disk disk = DiskWithUuid(store, uuid);
             if (!IsGrouped(disk)) Refuse("Disk " + uuid + " is not in use by Mesk");
             if (IsFronting(disk)) {
                 ReleaseGroup(store, disk);
@@ -320,7 +242,7 @@ void SimInfo::MountDiskGroup(const std::string& ssd, bool flag) {
 void SimInfo::MountByUuid(const std::string& uuid) {
     Serve(host_, Operation::MountByUuid, Json::array({uuid}), [&] {
         host_.Modify([&](StateStore& store) {
-            Json disk = DiskWithUuid(store, uuid);
+            Disk disk = DiskWithUuid(store, uuid);
             if (!IsGrouped(disk)) Refuse("Disk " + uuid + " is not in use by Mesk");
             if (IsFronting(disk)) {
                 SetGroupMounted(store, disk, true);
@@ -373,11 +295,10 @@ void SimInfo::SetAutoClaimMode(bool enabled) {
 
 void SimHost::GetMeskDisks(std::vector<std::shared_ptr<MeskDiskLun>>& luns) {
     Serve(*this, Operation::GetMeskDisks, Json::array(), [&] {
-        std::vector<StateStore::Lun> rows = Store().ReadLuns();
-        luns.reserve(luns.size() + rows.size());
-        for (const auto& row : rows) {
+        for (const Disk& disk : Store().Disks()) {
+            if (!disk.lun) continue;
             luns.push_back(
-                std::make_shared<SimLun>(row.name, HostBackend::StringToMeskUuid(row.uuid)));
+                std::make_shared<SimLun>(disk.name, HostBackend::StringToMeskUuid(disk.uuid)));
         }
     });
 }

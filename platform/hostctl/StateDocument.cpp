@@ -5,6 +5,7 @@
 #include <cstdio>
 #include <limits>
 #include <set>
+#include <type_traits>
 #include <vector>
 
 #include "hostctl/NetworkAddress.h"
@@ -128,28 +129,23 @@ std::string Indexed(const std::string& path, size_t index) {
 
 Json NormalizeDisk(const Json& value, const std::string& path) {
     Reader r(value, path);
-    Json d;
-    d["name"] = r.Text("name");
-    d["uuid"] = r.Uuid("uuid", false);
-    d["lun"] = r.Bool("lun");
-    d["isSsd"] = r.Bool("isSsd");
-    d["capacityBytes"] = r.Unsigned("capacityBytes");
-    d["diskGroupUuid"] = r.Uuid("diskGroupUuid", true);
-    d["diskGroupName"] = r.Text("diskGroupName");
-    d["usedByThisHost"] = r.Bool("usedByThisHost");
-    d["inKovra"] = r.Bool("inKovra");
-    d["formatVersion"] = r.Int("formatVersion", std::numeric_limits<int32_t>::min(),
-                               std::numeric_limits<int32_t>::max());
-    d["deduplication"] = r.Bool("deduplication");
-    d["checksum"] = r.Text("checksum");
-    d["checksumOk"] = r.Bool("checksumOk");
-    d["isCapacityTier"] = r.Bool("isCapacityTier");
-    d["encryption"] = r.Bool("encryption");
-    d["diskKeyLoaded"] = r.Bool("diskKeyLoaded");
-    d["mounted"] = r.Bool("mounted");
-    d["capacityFlashTag"] = r.Bool("capacityFlashTag");
+    Disk disk;
+    ForEachDiskField(disk, [&](const char* key, auto& member, DiskCheck check) {
+        using Type = std::decay_t<decltype(member)>;
+        if constexpr (std::is_same_v<Type, std::string>) {
+            member = check == DiskCheck::kNone ? r.Text(key)
+                                               : r.Uuid(key, check == DiskCheck::kUuidOrEmpty);
+        } else if constexpr (std::is_same_v<Type, bool>) {
+            member = r.Bool(key);
+        } else if constexpr (std::is_same_v<Type, uint64_t>) {
+            member = r.Unsigned(key);
+        } else {
+            member = r.Int(key, std::numeric_limits<int32_t>::min(),
+                           std::numeric_limits<int32_t>::max());
+        }
+    });
     r.Done();
-    return d;
+    return DiskDocument(disk);
 }
 
 Json NormalizeInterfaces(const Json& list, const std::string& path) {
@@ -166,26 +162,12 @@ Json NormalizeInterfaces(const Json& list, const std::string& path) {
 }
 
 Json DiskRecord(const std::string& name, const std::string& uuid, bool ssd, uint64_t bytes) {
-    Json d;
-    d["name"] = name;
-    d["uuid"] = uuid;
-    d["lun"] = true;
-    d["isSsd"] = ssd;
-    d["capacityBytes"] = bytes;
-    d["diskGroupUuid"] = "";
-    d["diskGroupName"] = "";
-    d["usedByThisHost"] = false;
-    d["inKovra"] = false;
-    d["formatVersion"] = 0;
-    d["deduplication"] = false;
-    d["checksum"] = "";
-    d["checksumOk"] = false;
-    d["isCapacityTier"] = false;
-    d["encryption"] = false;
-    d["diskKeyLoaded"] = false;
-    d["mounted"] = false;
-    d["capacityFlashTag"] = false;
-    return d;
+    Disk disk;
+    disk.name = name;
+    disk.uuid = uuid;
+    disk.isSsd = ssd;
+    disk.capacityBytes = bytes;
+    return DiskDocument(disk);
 }
 
 // A fixed, valid UUID text made from a prefix of 8 hex digits and a number.
@@ -197,6 +179,20 @@ std::string NumberedUuid(const char* prefix, uint64_t number) {
 }
 
 }  // namespace
+
+Json DiskDocument(const Disk& disk) {
+    Json document;
+    ForEachDiskField(
+        disk, [&](const char* key, const auto& member, DiskCheck) { document[key] = member; });
+    return document;
+}
+
+Disk DiskFromDocument(const Json& document) {
+    Disk disk;
+    ForEachDiskField(
+        disk, [&](const char* key, auto& member, DiskCheck) { document.at(key).get_to(member); });
+    return disk;
+}
 
 bool IsUuidText(const std::string& text) {
     if (text.size() != 36) return false;

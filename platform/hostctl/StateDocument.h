@@ -34,6 +34,60 @@ Json NormalizeHost(const Json& document);
 // One interface record of the document ("network.interfaces"), canonical.
 Json NormalizeInterface(const Json& record, const std::string& path);
 
+// A disk of the inventory ("storage.disks"). A new disk is unclaimed and has a device.
+struct Disk {
+    std::string name;  // its device name
+    std::string uuid;
+    bool lun = true;
+    bool isSsd = false;
+    uint64_t capacityBytes = 0;
+    std::string diskGroupUuid;  // the fronting SSD's UUID; "" for an unclaimed disk
+    std::string diskGroupName;
+    bool usedByThisHost = false;
+    bool inKovra = false;
+    int64_t formatVersion = 0;  // a 32-bit value
+    bool deduplication = false;
+    std::string checksum;
+    bool checksumOk = false;
+    bool isCapacityTier = false;
+    bool encryption = false;
+    bool diskKeyLoaded = false;
+    bool mounted = false;
+    bool capacityFlashTag = false;
+};
+
+// What the document requires of a disk field beyond its type.
+enum class DiskCheck { kNone, kUuid, kUuidOrEmpty, kInt32 };
+
+// Calls visit(key, member, check) for each field of `disk`, in document order: the one list
+// of a disk's fields, from which the document form, its checks and the state database's
+// columns are made. `DiskType` is Disk or const Disk.
+template <class DiskType, class Visit>
+void ForEachDiskField(DiskType& disk, Visit&& visit) {
+    visit("name", disk.name, DiskCheck::kNone);
+    visit("uuid", disk.uuid, DiskCheck::kUuid);
+    visit("lun", disk.lun, DiskCheck::kNone);
+    visit("isSsd", disk.isSsd, DiskCheck::kNone);
+    visit("capacityBytes", disk.capacityBytes, DiskCheck::kNone);
+    visit("diskGroupUuid", disk.diskGroupUuid, DiskCheck::kUuidOrEmpty);
+    visit("diskGroupName", disk.diskGroupName, DiskCheck::kNone);
+    visit("usedByThisHost", disk.usedByThisHost, DiskCheck::kNone);
+    visit("inKovra", disk.inKovra, DiskCheck::kNone);
+    visit("formatVersion", disk.formatVersion, DiskCheck::kInt32);
+    visit("deduplication", disk.deduplication, DiskCheck::kNone);
+    visit("checksum", disk.checksum, DiskCheck::kNone);
+    visit("checksumOk", disk.checksumOk, DiskCheck::kNone);
+    visit("isCapacityTier", disk.isCapacityTier, DiskCheck::kNone);
+    visit("encryption", disk.encryption, DiskCheck::kNone);
+    visit("diskKeyLoaded", disk.diskKeyLoaded, DiskCheck::kNone);
+    visit("mounted", disk.mounted, DiskCheck::kNone);
+    visit("capacityFlashTag", disk.capacityFlashTag, DiskCheck::kNone);
+}
+
+// A disk's document form, and the disk of a normalized document's disk.
+Json DiskDocument(const Disk& disk);
+Disk DiskFromDocument(const Json& document);
+
 // True iff `text` is a UUID in its 36-character text form (hexadecimal digits in either case).
 bool IsUuidText(const std::string& text);
 // `text` with its letters in lower case.

@@ -1,8 +1,8 @@
+// Reading and writing the simulated host's state: its tables, the transactions and what each
+// has read. StateOpen.cpp opens the database.
 #include "StateStore.h"
 
-#include <sys/stat.h>
-
-#include <cerrno>
+#include <stdexcept>
 
 #include "hostctl/MeskCtlException.h"
 
@@ -12,49 +12,73 @@ namespace HostCtlSim {
 
 namespace {
 
-const int kSchemaVersion = 1;
-const int kBusyTimeoutMs = 30000;
-
-const char* const kSchema = R"sql(
-CREATE TABLE IF NOT EXISTS section(name TEXT PRIMARY KEY, value TEXT NOT NULL) WITHOUT ROWID;
-CREATE TABLE IF NOT EXISTS disk(
-    uuid TEXT PRIMARY KEY,
-    position INTEGER NOT NULL,
-    name TEXT NOT NULL,
-    lun INTEGER NOT NULL,
-    grp TEXT NOT NULL,
-    record TEXT NOT NULL);
-CREATE INDEX IF NOT EXISTS disk_position ON disk(position);
-CREATE INDEX IF NOT EXISTS disk_name ON disk(name);
-CREATE INDEX IF NOT EXISTS disk_grp ON disk(grp);
-CREATE TABLE IF NOT EXISTS fault(
-    op TEXT NOT NULL, call INTEGER NOT NULL, message TEXT NOT NULL, PRIMARY KEY(op, call));
-CREATE TABLE IF NOT EXISTS call_log(
-    seq INTEGER PRIMARY KEY, invocation TEXT NOT NULL, time INTEGER NOT NULL,
-    entry TEXT NOT NULL);
-)sql";
-
 // The top-level keys stored as sections, in document order.
 const char* const kSections[] = {"host",    "cluster",  "membership", "unicastAgents", "network",
                                  "storage", "settings", "policies",   "resync"};
 
-void MakeDirectories(const std::string& path) {
-    for (size_t slash = path.find('/', 1); slash != std::string::npos;
-         slash = path.find('/', slash + 1)) {
-        mkdir(path.substr(0, slash).c_str(), 0755);
-    }
+// The disk table's columns, one per field of a disk, in document order: "name, uuid, ...".
+const std::string& DiskColumns() {
+    static const std::string columns = [] {
+        std::string list;
+        Disk disk;
+        ForEachDiskField(disk, [&](const char* key, auto&, DiskCheck) {
+            list += (list.empty() ? "" : ", ") + std::string(key);
+        });
+        return list;
+    }();
+    return columns;
 }
 
-std::string ColumnText(sqlite3_stmt* statement, int column) {
-    const unsigned char* text = sqlite3_column_text(statement, column);
-    return text ? std::string(reinterpret_cast<const char*>(text),
-                              static_cast<size_t>(sqlite3_column_bytes(statement, column)))
-                : std::string();
+// "?2, ?3, ..." for the disk's columns, from ?`first` on.
+std::string DiskParameters(int first) {
+    std::string list;
+    Disk disk;
+    ForEachDiskField(disk, [&](const char*, auto&, DiskCheck) {
+        list += (list.empty() ? "?" : ", ?") + std::to_string(first++);
+    });
+    return list;
+}
+
+bool IsReadOnlyError(int code) {
+    return (code & 0xff) == SQLITE_READONLY || (code & 0xff) == SQLITE_CANTOPEN ||
+           (code & 0xff) == SQLITE_PERM;
+}
+
+void Read(sqlite3_stmt* statement, int column, std::string& text) {
+    const unsigned char* value = sqlite3_column_text(statement, column);
+    text.assign(value ? reinterpret_cast<const char*>(value) : "",
+                static_cast<size_t>(sqlite3_column_bytes(statement, column)));
+}
+void Read(sqlite3_stmt* statement, int column, bool& flag) {
+    flag = sqlite3_column_int(statement, column) != 0;
+}
+void Read(sqlite3_stmt* statement, int column, int64_t& number) {
+    number = sqlite3_column_int64(statement, column);
+}
+// Sizes above 2^63 are kept as the integer of the same bits.
+void Read(sqlite3_stmt* statement, int column, uint64_t& number) {
+    number = static_cast<uint64_t>(sqlite3_column_int64(statement, column));
 }
 
 void Bind(sqlite3_stmt* statement, int index, const std::string& text) {
     sqlite3_bind_text(statement, index, text.data(), static_cast<int>(text.size()),
                       SQLITE_TRANSIENT);
+}
+void Bind(sqlite3_stmt* statement, int index, bool flag) {
+    sqlite3_bind_int(statement, index, flag ? 1 : 0);
+}
+void Bind(sqlite3_stmt* statement, int index, int64_t number) {
+    sqlite3_bind_int64(statement, index, number);
+}
+void Bind(sqlite3_stmt* statement, int index, uint64_t number) {
+    sqlite3_bind_int64(statement, index, static_cast<int64_t>(number));
+}
+
+// Binds the disk's fields to ?`first` and on.
+void BindDisk(sqlite3_stmt* statement, int first, const Disk& disk) {
+    ForEachDiskField(disk, [&](const char*, const auto& member, DiskCheck) {
+        Bind(statement, first++, member);
+    });
 }
 
 // Resets a prepared statement when the scope ends, whatever way it ends.
@@ -76,8 +100,7 @@ class Use {
 StateStore::StateStore(std::string path) : path_(std::move(path)) {}
 
 StateStore::~StateStore() {
-    for (auto& entry : statements_) sqlite3_finalize(entry.second);
-    if (db_ != nullptr) sqlite3_close(db_);
+    Disconnect();
 }
 
 void StateStore::Fail(const std::string& what) {
@@ -94,6 +117,12 @@ void StateStore::Exec(const char* sql) {
     }
 }
 
+int64_t StateStore::QueryNumber(const char* sql) {
+    Use query(Statement(sql));
+    if (sqlite3_step(query) != SQLITE_ROW) Fail("cannot read");
+    return sqlite3_column_int64(query, 0);
+}
+
 sqlite3_stmt* StateStore::Statement(const char* sql) {
     auto it = statements_.find(sql);
     if (it != statements_.end()) return it->second;
@@ -106,84 +135,70 @@ sqlite3_stmt* StateStore::Statement(const char* sql) {
     return statement;
 }
 
-bool StateStore::Open() {
-    if (db_ != nullptr) return false;
-    // Set once, before SQLite's first use in the process, for short-lived processes: no
-    // memory statistics (a mutex around every allocation), no page cache laid out in advance
-    // and a small lookaside, which every invocation would otherwise pay for in page faults.
-    static const bool configured = [] {
-        sqlite3_config(SQLITE_CONFIG_MEMSTATUS, 0);
-        sqlite3_config(SQLITE_CONFIG_PAGECACHE, nullptr, 0, 0);
-        sqlite3_config(SQLITE_CONFIG_LOOKASIDE, 128, 32);
-        return true;
-    }();
-    (void)configured;
-    MakeDirectories(path_);
-    if (sqlite3_open_v2(path_.c_str(), &db_, SQLITE_OPEN_READWRITE | SQLITE_OPEN_CREATE, nullptr) !=
-        SQLITE_OK) {
-        std::string detail = db_ != nullptr ? sqlite3_errmsg(db_) : "out of memory";
-        sqlite3_close(db_);
-        db_ = nullptr;
-        throw MeskCtlException("Simulated host state " + path_ + ": cannot open: " + detail);
-    }
-    try {
-        return Prepare();
-    } catch (...) {
-        for (auto& entry : statements_) sqlite3_finalize(entry.second);
-        statements_.clear();
-        sqlite3_close(db_);
-        db_ = nullptr;
-        throw;
-    }
+void StateStore::Forget() {
+    sections_.clear();
+    disksLoaded_ = false;
+    disks_.clear();
+    byUuid_.clear();
+    byDevice_.clear();
 }
 
-bool StateStore::Prepare() {
-    sqlite3_busy_timeout(db_, kBusyTimeoutMs);
-    // In WAL mode, NORMAL syncs only when the log is folded back into the database, not on
-    // every commit: a killed process leaves a consistent state, and even a crash of the
-    // machine can lose at most the last changes, never corrupt the database. A sync on every
-    // commit would cost each invocation milliseconds of waiting for the disk.
-    Exec("PRAGMA synchronous=NORMAL");
-    if (SchemaVersion() == kSchemaVersion) return false;
-    if (SchemaVersion() > kSchemaVersion) {
-        throw MeskCtlException("Simulated host state " + path_ + ": made by a newer hostsim");
-    }
-
-    // A new database: switch it to WAL (a setting kept in the file), then create the host.
-    // Another process may be doing the same; the transaction decides which one does it.
-    Exec("PRAGMA journal_mode=WAL");
-    Transaction transaction(*this);
-    if (SchemaVersion() == kSchemaVersion) return false;
-    Exec(kSchema);
-    Replace(NormalizeHost(DefaultHost()));
-    Exec(("PRAGMA user_version=" + std::to_string(kSchemaVersion)).c_str());
-    transaction.Commit();
-    return true;
+void StateStore::BeginRead() {
+    if (transaction_ != TransactionKind::kNone) return;
+    Exec("BEGIN");
+    transaction_ = TransactionKind::kReading;
 }
 
-int StateStore::SchemaVersion() {
-    Use query(Statement("PRAGMA user_version"));
-    return sqlite3_step(query) == SQLITE_ROW ? sqlite3_column_int(query, 0) : 0;
+void StateStore::BeginWrite() {
+    if (db_ == nullptr) Open();
+    if (transaction_ == TransactionKind::kWriting) {
+        throw std::logic_error("a change of the simulated host begun within another");
+    }
+    // The read transaction ends, and with it everything it read: the change reads the state
+    // as it is when it holds the write lock.
+    if (transaction_ == TransactionKind::kReading) EndTransaction("COMMIT");
+    if (!writable_) {
+        Disconnect();
+        Connect(path_, true);
+    }
+    int code = sqlite3_exec(db_, "BEGIN IMMEDIATE", nullptr, nullptr, nullptr);
+    if (IsReadOnlyError(code)) RefuseChange();
+    if (code != SQLITE_OK) Fail("cannot begin a change");
+    transaction_ = TransactionKind::kWriting;
+}
+
+void StateStore::EndTransaction(const char* sql) {
+    transaction_ = TransactionKind::kNone;
+    Forget();
+    if (sqlite3_exec(db_, sql, nullptr, nullptr, nullptr) != SQLITE_OK) Fail(sql);
 }
 
 StateStore::Transaction::Transaction(StateStore& store) : store_(store) {
-    store_.Exec("BEGIN IMMEDIATE");
+    store_.BeginWrite();
 }
 
 StateStore::Transaction::~Transaction() {
-    if (!done_) sqlite3_exec(store_.db_, "ROLLBACK", nullptr, nullptr, nullptr);
+    if (done_) return;
+    store_.transaction_ = TransactionKind::kNone;
+    store_.Forget();
+    sqlite3_exec(store_.db_, "ROLLBACK", nullptr, nullptr, nullptr);
 }
 
 void StateStore::Transaction::Commit() {
-    store_.Exec("COMMIT");
+    store_.EndTransaction("COMMIT");
     done_ = true;
 }
 
-Json StateStore::ReadSection(const std::string& name) {
+const Json& StateStore::ReadSection(const std::string& name) {
+    auto cached = sections_.find(name);
+    if (cached != sections_.end()) return cached->second;
+    BeginRead();
     Use query(Statement("SELECT value FROM section WHERE name = ?1"));
     Bind(query, 1, name);
     if (sqlite3_step(query) != SQLITE_ROW) Fail("no section " + name);
-    return Json::parse(ColumnText(query, 0));
+    std::string text;
+    Read(query, 0, text);
+    return sections_[name] = Json::parse(text);
 }
 
 void StateStore::WriteSection(const std::string& name, const Json& value) {
@@ -191,117 +206,118 @@ void StateStore::WriteSection(const std::string& name, const Json& value) {
     Bind(statement, 1, name);
     Bind(statement, 2, JsonText(value));
     if (sqlite3_step(statement) != SQLITE_DONE) Fail("cannot write " + name);
+    sections_[name] = value;
 }
 
-std::vector<StateStore::Lun> StateStore::ReadLuns() {
-    Use query(Statement("SELECT name, uuid FROM disk WHERE lun ORDER BY position"));
-    std::vector<Lun> luns;
-    while (sqlite3_step(query) == SQLITE_ROW) {
-        luns.push_back(Lun{ColumnText(query, 0), ColumnText(query, 1)});
+void StateStore::LoadDisks() {
+    if (disksLoaded_) return;
+    BeginRead();
+    static const std::string select = "SELECT " + DiskColumns() + " FROM disk ORDER BY position";
+    Use query(Statement(select.c_str()));
+    disks_.clear();
+    int step;
+    while ((step = sqlite3_step(query)) == SQLITE_ROW) {
+        Disk& disk = disks_.emplace_back();
+        int column = 0;
+        ForEachDiskField(
+            disk, [&](const char*, auto& member, DiskCheck) { Read(query, column++, member); });
     }
-    return luns;
+    if (step != SQLITE_DONE) Fail("cannot read the disks");
+    // The disks are in place now: the keys stay valid until they are read again.
+    byUuid_.clear();
+    byDevice_.clear();
+    byUuid_.reserve(disks_.size());
+    byDevice_.reserve(disks_.size());
+    for (size_t i = 0; i < disks_.size(); ++i) {
+        byUuid_.emplace(disks_[i].uuid, i);
+        if (disks_[i].lun) byDevice_.emplace(disks_[i].name, i);
+    }
+    disksLoaded_ = true;
 }
 
-std::vector<std::string> StateStore::ReadGroupedDiskUuids() {
-    Use query(Statement("SELECT uuid FROM disk WHERE grp <> '' ORDER BY position"));
-    std::vector<std::string> uuids;
-    while (sqlite3_step(query) == SQLITE_ROW) uuids.push_back(ColumnText(query, 0));
-    return uuids;
+const std::vector<Disk>& StateStore::Disks() {
+    LoadDisks();
+    return disks_;
 }
 
-bool StateStore::ReadDisk(const std::string& uuid, Json& disk) {
-    std::string record;
-    if (!ReadDiskRecord(uuid, record)) return false;
-    disk = Json::parse(record);
-    return true;
+const Disk* StateStore::FindDisk(const std::string& uuid) {
+    LoadDisks();
+    return Find(byUuid_, uuid);
 }
 
-bool StateStore::ReadDiskRecord(const std::string& uuid, std::string& record) {
-    Use query(Statement("SELECT record FROM disk WHERE uuid = ?1"));
-    Bind(query, 1, uuid);
-    if (sqlite3_step(query) != SQLITE_ROW) return false;
-    record = ColumnText(query, 0);
-    return true;
+const Disk* StateStore::FindDevice(const std::string& name) {
+    LoadDisks();
+    return Find(byDevice_, name);
 }
 
-bool StateStore::ReadDiskByName(const std::string& name, Json& disk) {
-    Use query(Statement("SELECT record FROM disk WHERE name = ?1 AND lun"));
-    Bind(query, 1, name);
-    if (sqlite3_step(query) != SQLITE_ROW) return false;
-    disk = Json::parse(ColumnText(query, 0));
-    return true;
+const Disk* StateStore::Find(const std::unordered_map<std::string_view, size_t>& index,
+                             const std::string& key) const {
+    auto it = index.find(key);
+    return it == index.end() ? nullptr : &disks_[it->second];
 }
 
-std::vector<Json> StateStore::ReadDiskGroup(const std::string& groupUuid) {
-    Use query(Statement("SELECT record FROM disk WHERE grp = ?1 ORDER BY position"));
-    Bind(query, 1, groupUuid);
-    std::vector<Json> disks;
-    while (sqlite3_step(query) == SQLITE_ROW) disks.push_back(Json::parse(ColumnText(query, 0)));
-    return disks;
-}
-
-void StateStore::UpdateDisk(const Json& disk) {
-    Use statement(
-        Statement("UPDATE disk SET name = ?2, lun = ?3, grp = ?4, record = ?5 "
-                  "WHERE uuid = ?1"));
-    Bind(statement, 1, disk["uuid"].get<std::string>());
-    Bind(statement, 2, disk["name"].get<std::string>());
-    sqlite3_bind_int(statement, 3, disk["lun"].get<bool>() ? 1 : 0);
-    Bind(statement, 4, disk["diskGroupUuid"].get<std::string>());
-    Bind(statement, 5, JsonText(disk));
+void StateStore::WriteDisk(const Disk& disk) {
+    static const std::string update =
+        "UPDATE disk SET (" + DiskColumns() + ") = (" + DiskParameters(2) + ") WHERE uuid = ?1";
+    Use statement(Statement(update.c_str()));
+    Bind(statement, 1, disk.uuid);
+    BindDisk(statement, 2, disk);
     if (sqlite3_step(statement) != SQLITE_DONE) Fail("cannot write a disk");
-}
-
-void StateStore::InsertDisk(const Json& disk, int64_t position) {
-    Use statement(
-        Statement("INSERT INTO disk(uuid, position, name, lun, grp, record) "
-                  "VALUES(?1, ?2, ?3, ?4, ?5, ?6)"));
-    Bind(statement, 1, disk["uuid"].get<std::string>());
-    sqlite3_bind_int64(statement, 2, position);
-    Bind(statement, 3, disk["name"].get<std::string>());
-    sqlite3_bind_int(statement, 4, disk["lun"].get<bool>() ? 1 : 0);
-    Bind(statement, 5, disk["diskGroupUuid"].get<std::string>());
-    Bind(statement, 6, JsonText(disk));
-    if (sqlite3_step(statement) != SQLITE_DONE) Fail("cannot write a disk");
+    // The cache follows, unless the disk moves in an index.
+    const Disk* cached = disksLoaded_ ? Find(byUuid_, disk.uuid) : nullptr;
+    if (cached != nullptr && cached->name == disk.name && cached->lun == disk.lun) {
+        disks_[static_cast<size_t>(cached - disks_.data())] = disk;
+    } else {
+        disksLoaded_ = false;
+    }
 }
 
 void StateStore::DeleteDisk(const std::string& uuid) {
     Use statement(Statement("DELETE FROM disk WHERE uuid = ?1"));
     Bind(statement, 1, uuid);
     if (sqlite3_step(statement) != SQLITE_DONE) Fail("cannot delete a disk");
+    disksLoaded_ = false;
 }
 
 Json StateStore::Dump() {
-    // One read transaction, so that the sections agree with each other.
-    bool own = sqlite3_get_autocommit(db_) != 0;
-    if (own) Exec("BEGIN");
     Json host;
     for (const char* name : kSections) host[name] = ReadSection(name);
     Json disks = Json::array();
-    Use query(Statement("SELECT record FROM disk ORDER BY position"));
-    while (sqlite3_step(query) == SQLITE_ROW) disks.push_back(Json::parse(ColumnText(query, 0)));
+    for (const Disk& disk : Disks()) disks.push_back(DiskDocument(disk));
     host["storage"]["disks"] = std::move(disks);
-    if (own) Exec("COMMIT");
     return host;
 }
 
 void StateStore::Replace(const Json& host) {
     Exec("DELETE FROM section; DELETE FROM disk;");
+    Forget();
     for (const char* name : kSections) {
         Json value = host.at(name);
         if (value.is_object()) value.erase("disks");
         WriteSection(name, value);
     }
+    static const std::string insert =
+        "INSERT INTO disk(position, " + DiskColumns() + ") VALUES(?1, " + DiskParameters(2) + ")";
+    Use statement(Statement(insert.c_str()));
     int64_t position = 0;
-    for (const Json& disk : host.at("storage").at("disks")) InsertDisk(disk, position++);
+    for (const Json& disk : host.at("storage").at("disks")) {
+        sqlite3_bind_int64(statement, 1, position++);
+        BindDisk(statement, 2, DiskFromDocument(disk));
+        if (sqlite3_step(statement) != SQLITE_DONE) Fail("cannot write a disk");
+        sqlite3_reset(statement);
+    }
 }
 
 std::vector<Fault> StateStore::ReadFaults() {
+    BeginRead();
     Use query(Statement("SELECT op, call, message FROM fault ORDER BY op, call"));
     std::vector<Fault> faults;
     while (sqlite3_step(query) == SQLITE_ROW) {
-        faults.push_back(
-            Fault{ColumnText(query, 0), sqlite3_column_int64(query, 1), ColumnText(query, 2)});
+        Fault fault;
+        Read(query, 0, fault.op);
+        Read(query, 1, fault.call);
+        Read(query, 2, fault.message);
+        faults.push_back(std::move(fault));
     }
     return faults;
 }
@@ -309,52 +325,13 @@ std::vector<Fault> StateStore::ReadFaults() {
 void StateStore::SetFault(const Fault& fault) {
     Use statement(Statement("INSERT OR REPLACE INTO fault(op, call, message) VALUES(?1, ?2, ?3)"));
     Bind(statement, 1, fault.op);
-    sqlite3_bind_int64(statement, 2, fault.call);
+    Bind(statement, 2, fault.call);
     Bind(statement, 3, fault.message);
     if (sqlite3_step(statement) != SQLITE_DONE) Fail("cannot write a failure");
 }
 
 void StateStore::ClearFaults() {
     Exec("DELETE FROM fault");
-}
-
-void StateStore::AppendCalls(const std::string& invocation, const std::vector<CallRecord>& calls) {
-    bool logged = false;
-    {
-        Use query(Statement("SELECT 1 FROM call_log WHERE invocation = ?1 LIMIT 1"));
-        Bind(query, 1, invocation);
-        logged = sqlite3_step(query) == SQLITE_ROW;
-    }
-    if (logged) {
-        Use statement(Statement("DELETE FROM call_log WHERE invocation <> ?1"));
-        Bind(statement, 1, invocation);
-        if (sqlite3_step(statement) != SQLITE_DONE) Fail("cannot clear the call log");
-    } else {
-        // The invocation's first calls: every row is another's, and a DELETE without WHERE
-        // drops the table's pages at once instead of tens of thousands of rows one by one.
-        ClearCalls();
-    }
-    Use statement(Statement("INSERT INTO call_log(invocation, time, entry) VALUES(?1, ?2, ?3)"));
-    for (const CallRecord& call : calls) {
-        Bind(statement, 1, invocation);
-        sqlite3_bind_int64(statement, 2, call.time);
-        Bind(statement, 3, call.entry);
-        if (sqlite3_step(statement) != SQLITE_DONE) Fail("cannot write the call log");
-        sqlite3_reset(statement);
-    }
-}
-
-std::vector<CallRecord> StateStore::ReadCalls() {
-    Use query(Statement("SELECT time, entry FROM call_log ORDER BY seq"));
-    std::vector<CallRecord> calls;
-    while (sqlite3_step(query) == SQLITE_ROW) {
-        calls.push_back(CallRecord{sqlite3_column_int64(query, 0), ColumnText(query, 1)});
-    }
-    return calls;
-}
-
-void StateStore::ClearCalls() {
-    Exec("DELETE FROM call_log");
 }
 
 }  // namespace HostCtlSim

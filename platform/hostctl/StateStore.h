@@ -1,13 +1,17 @@
-// The simulated host's state database (SQLite).
+// The simulated host's state database (SQLite): every read and write of the host's state.
 //
-// The database holds the host document of StateDocument.h, cut into sections: each top-level
-// key is one row of `section` (its JSON text), except the disks, which are rows of `disk`
-// indexed by UUID, by device name and by disk group, so that one disk is found without reading
-// the inventory. It also holds the injected failures and the call log of the last invocation.
+// The database holds the host document of StateDocument.h: each small top-level key is one
+// row of `section` (its JSON text), and each disk one row of `disk`, a column per field, so
+// that a listing reads thousands of disks without parsing a JSON text for each. It also holds
+// the injected failures. Its application id and schema version mark it as a simulated host;
+// any other file is refused untouched.
 //
-// Readers need no lock (WAL mode); every change runs in one BEGIN IMMEDIATE transaction, so
-// that concurrent processes queue up behind a busy timeout and a killed process leaves the
-// state as it was before or after the change.
+// A process that only reads opens the database read-only and writes nothing: the first read
+// begins one read transaction, which lasts until the process changes something or ends, and
+// everything it reads is kept, so that all reads of an invocation agree and each is read once.
+// Every change is one BEGIN IMMEDIATE transaction on a read-write connection, so that
+// concurrent processes queue up behind a busy timeout and a killed process leaves the state as
+// it was before or after the change; reads after a change see it.
 #pragma once
 
 #include <sqlite3.h>
@@ -15,17 +19,13 @@
 #include <cstdint>
 #include <map>
 #include <string>
+#include <string_view>
+#include <unordered_map>
 #include <vector>
 
 #include "StateDocument.h"
 
 namespace HostCtlSim {
-
-// One operation recorded in the call log.
-struct CallRecord {
-    int64_t time = 0;   // nanoseconds since the epoch
-    std::string entry;  // {"op": name, "args": [...]} and "error" when the call threw
-};
 
 // A failure injected into one operation: every call (call 0) or only the Nth of each invocation.
 struct Fault {
@@ -42,13 +42,18 @@ class StateStore {
     StateStore(const StateStore&) = delete;
     StateStore& operator=(const StateStore&) = delete;
 
-    // Opens the database, creating the file and its parent directories and filling it with
-    // the default host when it holds no host yet. Returns true iff it made the default host.
-    // Throws MeskCtlException when the database cannot be used.
+    // Opens the state for reading. A path that does not exist yet (or an empty file) becomes a
+    // fresh host, made whole before anyone else can see it; returns true iff this call made it.
+    // Throws MeskCtlException, naming the path and what is wrong, for anything that is not a
+    // simulated host of this version; such a file is left as it was.
     bool Open();
+    // Like Open, but a host made by an older hostsim is emptied, to be replaced whole.
+    bool OpenForReplacement();
     const std::string& Path() const { return path_; }
 
-    // A BEGIN IMMEDIATE transaction, rolled back unless committed.
+    // A change: BEGIN IMMEDIATE on a read-write connection, rolled back unless committed.
+    // Reads within it see the state as it is now. Throws MeskCtlException ("cannot change the
+    // simulated host: PATH is read-only for this user") when the user may not write the state.
     class Transaction {
       public:
         explicit Transaction(StateStore& store);
@@ -60,49 +65,63 @@ class StateStore {
         bool done_ = false;
     };
 
+    // Reading. References stay valid until the next change of the same item or the end of the
+    // transaction.
     // One top-level key of the document (not "storage.disks" nor "services").
-    Json ReadSection(const std::string& name);
-    void WriteSection(const std::string& name, const Json& value);
-
-    // Disks, in inventory order where several are returned.
-    struct Lun {
-        std::string name;
-        std::string uuid;
-    };
-    std::vector<Lun> ReadLuns();                      // disks for which the host has a device
-    std::vector<std::string> ReadGroupedDiskUuids();  // disks held in a disk group
-    bool ReadDisk(const std::string& uuid, Json& disk);
-    bool ReadDiskRecord(const std::string& uuid, std::string& record);  // its JSON text
-    bool ReadDiskByName(const std::string& name, Json& disk);           // a disk with a device
-    std::vector<Json> ReadDiskGroup(const std::string& groupUuid);
-    void UpdateDisk(const Json& disk);  // by its UUID
-    void DeleteDisk(const std::string& uuid);
-
-    // The whole host without its services, and its replacement by a normalized document.
+    const Json& ReadSection(const std::string& name);
+    // Every disk, in inventory order.
+    const std::vector<Disk>& Disks();
+    // The disk with that UUID (lower case), or nullptr.
+    const Disk* FindDisk(const std::string& uuid);
+    // The disk for which the host has a device of that name, or nullptr.
+    const Disk* FindDevice(const std::string& name);
+    // The whole host without its services.
     Json Dump();
-    void Replace(const Json& host);  // within a transaction of the caller
-
     std::vector<Fault> ReadFaults();
+
+    // Changing, within a Transaction.
+    void WriteSection(const std::string& name, const Json& value);
+    void WriteDisk(const Disk& disk);  // the disk of that UUID
+    void DeleteDisk(const std::string& uuid);
+    void Replace(const Json& host);  // by a normalized document
     void SetFault(const Fault& fault);
     void ClearFaults();
 
-    // Replaces the log of every other invocation by `calls`, or adds them to the log of the
-    // same invocation.
-    void AppendCalls(const std::string& invocation, const std::vector<CallRecord>& calls);
-    std::vector<CallRecord> ReadCalls();
-    void ClearCalls();
-
   private:
-    bool Prepare();
-    int SchemaVersion();
+    enum class Kind { kMissing, kHost, kOlderHost };
+    Kind Inspect();
+    bool OpenAs(bool replacing);
+    bool Create();
+    void Connect(const std::string& path, bool writable);
+    void Disconnect();
+    void BeginRead();
+    void BeginWrite();
+    void EndTransaction(const char* sql);
+    void Forget();
+    void LoadDisks();
+    const Disk* Find(const std::unordered_map<std::string_view, size_t>& index,
+                     const std::string& key) const;
     sqlite3_stmt* Statement(const char* sql);
+    int64_t QueryNumber(const char* sql);  // the first column of the first row
+    [[noreturn]] void RefuseChange();
     void Exec(const char* sql);
     [[noreturn]] void Fail(const std::string& what);
-    void InsertDisk(const Json& disk, int64_t position);
 
     std::string path_;
     sqlite3* db_ = nullptr;
+    bool writable_ = false;
+    enum class TransactionKind { kNone, kReading, kWriting };
+    TransactionKind transaction_ = TransactionKind::kNone;
     std::map<const char*, sqlite3_stmt*> statements_;
+
+    // What the current transaction has read.
+    std::map<std::string, Json> sections_;
+    bool disksLoaded_ = false;
+    std::vector<Disk> disks_;
+    // Indexes of disks_, by UUID and, of the disks with a device, by name; the keys are the
+    // disks' own texts.
+    std::unordered_map<std::string_view, size_t> byUuid_;
+    std::unordered_map<std::string_view, size_t> byDevice_;
 };
 
 }  // namespace HostCtlSim

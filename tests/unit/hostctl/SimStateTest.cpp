@@ -7,6 +7,7 @@
 #include <map>
 #include <regex>
 
+#include "CallLog.h"
 #include "HostRoot.h"
 #include "Operations.h"
 #include "SimFixture.h"
@@ -26,7 +27,9 @@ const auto J = [](const char* text) { return Json::parse(text); };
 
 std::vector<Json> LoggedCalls(SimHost& host) {
     std::vector<Json> calls;
-    for (const auto& call : host.Store().ReadCalls()) calls.push_back(Json::parse(call.entry));
+    for (const auto& call : HostCtlSim::CallLog::Read(host.Root())) {
+        calls.push_back(Json::parse(call.entry));
+    }
     return calls;
 }
 
@@ -78,8 +81,12 @@ TEST_F(SimState, MalformedDocumentsAreRefusedNamingTheKey) {
 }
 
 TEST_F(SimState, InjectedFailuresHitEveryCallOrTheNth) {
-    host_->Store().SetFault({"GetDatastoreName", 2, "second call fails"});
-    host_->Store().SetFault({"AddDisks", 0, "no disks today"});
+    {
+        HostCtlSim::StateStore::Transaction transaction(host_->Store());
+        host_->Store().SetFault({"GetDatastoreName", 2, "second call fails"});
+        host_->Store().SetFault({"AddDisks", 0, "no disks today"});
+        transaction.Commit();
+    }
     NewInvocation();
     EXPECT_EQ(Info().GetDatastoreName(), "meskDatastore");
     try {
@@ -97,6 +104,21 @@ TEST_F(SimState, InjectedFailuresHitEveryCallOrTheNth) {
     NewInvocation();
     Info().GetDatastoreName();
     EXPECT_THROW(Info().GetDatastoreName(), MeskCtlException);
+}
+
+// An invocation answers from one snapshot of the host: another process's change made after
+// its first call stays out of sight until the invocation changes the host itself.
+TEST_F(SimState, InvocationReadsOneSnapshotAndSeesItsOwnChanges) {
+    EXPECT_EQ(Info().GetDatastoreName(), "meskDatastore");
+    {
+        SimHost other(options_);
+        auto plugin = other.GetMeskPlugin();
+        plugin->GetMeskInfo()->SetDatastoreName("elsewhere");
+    }
+    EXPECT_EQ(Info().GetDatastoreName(), "meskDatastore");
+    Info().SetResyncThrottle(3);
+    EXPECT_EQ(Info().GetResyncThrottle(), 3);
+    EXPECT_EQ(Info().GetDatastoreName(), "elsewhere");
 }
 
 TEST_F(SimState, CallLogHoldsTheLastInvocationsCallsInOrder) {
