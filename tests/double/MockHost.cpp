@@ -18,80 +18,16 @@ using ::testing::ReturnRef;
 
 namespace {
 
-// Forwards every MeskInfo operation to the test's mock; counts its own release.
+// Forwards every operation to the test's mock; counts its own release.
 template <class Base>
 class InfoForward : public Base {
   public:
-    InfoForward(MockMeskInfo& target, int& released) : t_(target), released_(released) {}
+    InfoForward(MockMeskInfo& target, int& released) : target_(target), released_(released) {}
     ~InfoForward() override { ++released_; }
-
-    const MeskClusterConfig& GetClusterConfig() override { return t_.GetClusterConfig(); }
-    bool IsWitness() override { return t_.IsWitness(); }
-    MeskConfigGeneration GetConfigGeneration() override { return t_.GetConfigGeneration(); }
-    void JoinCluster(const Uuid& u, bool w, const std::string& p, bool wait, int32_t f) override {
-        t_.JoinCluster(u, w, p, wait, f);
-    }
-    void CreateCluster(const std::string& u, bool a, bool b) override { t_.CreateCluster(u, a, b); }
-    void LeaveCluster(bool f) override { t_.LeaveCluster(f); }
-    void RestoreClusterConfig(bool b) override { t_.RestoreClusterConfig(b); }
-    void SetPreferredFaultDomain(const std::string& n) override { t_.SetPreferredFaultDomain(n); }
-    void GetUnicastWitnesses(std::vector<std::string>& w) override { t_.GetUnicastWitnesses(w); }
-    void AddUnicastAgent(const std::string& u, bool w, bool s, const MeskIpAddress& a, int32_t p,
-                         bool h, const std::string& i) override {
-        t_.AddUnicastAgent(u, w, s, a, p, h, i);
-    }
-    void RefreshUnicastAgents() override { t_.RefreshUnicastAgents(); }
-    void GetUnicastAgents(std::vector<std::string>& a) override { t_.GetUnicastAgents(a); }
-    bool RemoveUnicastAgent(const std::string& u, const MeskIpAddress& a, int32_t p) override {
-        return t_.RemoveUnicastAgent(u, a, p);
-    }
-    bool IsZuvNicInUse(const std::string& n, const std::string& t) override {
-        return t_.IsZuvNicInUse(n, t);
-    }
-    bool RemoveZuvNic(const std::string& n, bool f, const std::string& t) override {
-        return t_.RemoveZuvNic(n, f, t);
-    }
-    void ClearNetworkConfig() override { t_.ClearNetworkConfig(); }
-    void RestoreNetworkConfig() override { t_.RestoreNetworkConfig(); }
-    void GetMeskDiskUuids(std::vector<Uuid>& u) override { t_.GetMeskDiskUuids(u); }
-    void GetDiskInfo(const Uuid& u, const LunList& l, MeskDiskInfo& i) override {
-        t_.GetDiskInfo(u, l, i);
-    }
-    void AddDisks(const std::string& s, const std::vector<std::string>& d) override {
-        t_.AddDisks(s, d);
-    }
-    void RemoveDisk(const std::string& d, const std::string& m) override { t_.RemoveDisk(d, m); }
-    void RemoveDiskGroup(const std::string& s, const std::string& m) override {
-        t_.RemoveDiskGroup(s, m);
-    }
-    void RemoveDiskByUuid(const std::string& u, const std::string& m) override {
-        t_.RemoveDiskByUuid(u, m);
-    }
-    void MountDiskGroup(const std::string& s, bool f) override { t_.MountDiskGroup(s, f); }
-    void MountByUuid(const std::string& u) override { t_.MountByUuid(u); }
-    void MountDisk(const std::string& d) override { t_.MountDisk(d); }
-    void UnmountDiskGroup(const std::string& s, bool f) override { t_.UnmountDiskGroup(s, f); }
-    void UnmountDisk(const std::string& d, bool f) override { t_.UnmountDisk(d, f); }
-    void AddCapacityFlashTag(const std::string& d) override { t_.AddCapacityFlashTag(d); }
-    void RemoveCapacityFlashTag(const std::string& d) override { t_.RemoveCapacityFlashTag(d); }
-    bool GetAutoClaimMode() override { return t_.GetAutoClaimMode(); }
-    void SetAutoClaimMode(bool e) override { t_.SetAutoClaimMode(e); }
-    std::string GetDatastoreName() override { return t_.GetDatastoreName(); }
-    void SetDatastoreName(const std::string& n) override { t_.SetDatastoreName(n); }
-    std::string GetFaultDomainName() override { return t_.GetFaultDomainName(); }
-    void SetFaultDomainName(const std::string& n) override { t_.SetFaultDomainName(n); }
-    void ResetFaultDomainName() override { t_.ResetFaultDomainName(); }
-    std::string GetDefaultPolicy(const std::string& c) override { return t_.GetDefaultPolicy(c); }
-    void SetDefaultPolicy(const std::string& c, const std::string& p) override {
-        t_.SetDefaultPolicy(c, p);
-    }
-    void ClearDefaultPolicies() override { t_.ClearDefaultPolicies(); }
-    int64_t GetResyncBandwidth() override { return t_.GetResyncBandwidth(); }
-    int64_t GetResyncThrottle() override { return t_.GetResyncThrottle(); }
-    void SetResyncThrottle(int64_t l) override { t_.SetResyncThrottle(l); }
+    MESK_INFO_OPERATIONS(MESK_FORWARD_OPERATION)
 
   protected:
-    MockMeskInfo& t_;
+    MockMeskInfo& target_;
     int& released_;
 };
 
@@ -103,8 +39,7 @@ class BasicInfo : public InfoForward<HostCtl::Mesk::MeskInfo> {
 class ExtendedInfo : public InfoForward<HostCtl::Mesk::MeskInfo2> {
   public:
     using InfoForward::InfoForward;
-    NicList GetZuvNicConfigs() override { return t_.GetZuvNicConfigs(); }
-    bool SetZuvNicConfig(const MeskZuvNicConfig2& c) override { return t_.SetZuvNicConfig(c); }
+    MESK_INFO2_OPERATIONS(MESK_FORWARD_OPERATION)
 };
 
 class FakePlugin : public HostCtl::MeskPlugin {
@@ -184,6 +119,37 @@ Uuid UuidOf(const std::string& text) {
     return HostCtlSim::CurrentBackend().HostBackend::StringToMeskUuid(text);
 }
 
+std::string Arg(const std::string& text) {
+    return text;
+}
+
+std::string Arg(const std::vector<std::string>& texts) {
+    std::string joined;
+    for (const auto& text : texts) joined += (joined.empty() ? "" : ",") + text;
+    return joined;
+}
+
+std::string Arg(const MeskIpAddress& address) {
+    return (address.IsIpv6() ? "v6:" : "v4:") + address.GetStringAddress();
+}
+
+std::string Arg(const Uuid& uuid) {
+    return HostCtlSim::CurrentBackend().HostBackend::MeskUuidToString(uuid);
+}
+
+std::string Arg(const MeskZuvNicConfig2& nic) {
+    std::ostringstream text;
+    text << nic.GetZuvnicName() << ' ' << nic.GetAgentMulticastGroup().GetStringAddress() << ' '
+         << nic.GetAgentV6MulticastGroup().GetStringAddress() << ' '
+         << nic.GetMasterMulticastGroup().GetStringAddress() << ' '
+         << nic.GetMasterV6MulticastGroup().GetStringAddress() << ' ' << nic.GetAgentMulticastPort()
+         << ' ' << nic.GetMasterMulticastPort() << ' ' << nic.GetHostUnicastPort() << ' '
+         << nic.GetMulticastTTL() << (nic.meskTraffic ? " mesk" : "")
+         << (nic.witnessTraffic ? " witness" : "");
+    if (!nic.GetOptions().empty()) text << " (" << nic.GetOptions() << ")";
+    return text.str();
+}
+
 HostTest::HostTest() {
     HostCtlSim::SetBackend(&host);
 }
@@ -199,9 +165,64 @@ std::shared_ptr<Kalmor::CallSpec::Output> HostTest::Run(
     return output;
 }
 
+std::shared_ptr<Kalmor::CallSpec::Output> HostTest::Run(Kalmor::AutoCli::Command& command,
+                                                        const std::string& options) {
+    auto input = Kalmor::CallSpec::Input::New();
+    std::istringstream words(options);
+    for (std::string word; words >> word;) {
+        const size_t equals = word.find('=');
+        if (equals == std::string::npos) {
+            input->SetFlag(word);
+        } else {
+            input->AddParameterValue(word.substr(0, equals), word.substr(equals + 1));
+        }
+    }
+    return Run(command, input);
+}
+
 void HostTest::SetEnabled(bool enabled, const std::string& clusterUuid) {
     info.clusterConfig.enabled = enabled;
     info.clusterConfig.clusterUuid = clusterUuid;
+}
+
+std::string Shown(const std::shared_ptr<MetaObject>& value) {
+    if (!value) return "no result";
+    std::string text;
+    if (auto s = std::dynamic_pointer_cast<MetaString>(value)) {
+        return s->HasValue() ? s->GetValue() : "null";
+    } else if (auto i = std::dynamic_pointer_cast<MetaInt>(value)) {
+        return i->HasValue() ? std::to_string(i->GetValue()) : "null";
+    } else if (auto b = std::dynamic_pointer_cast<MetaBool>(value)) {
+        return !b->HasValue() ? "null" : b->GetValue() ? "true" : "false";
+    } else if (auto structure = std::dynamic_pointer_cast<MetaStruct>(value)) {
+        for (const auto& field : structure->GetFields()) {
+            text += (text.empty() ? "" : ", ") + field.name + "=" + Shown(field.value);
+        }
+        return "{" + text + "}";
+    }
+    for (const auto& element : Elements(value)) text += (text.empty() ? "" : ", ") + element;
+    return "[" + text + "]";
+}
+
+std::string Outcome(const Kalmor::CallSpec::Output& output) {
+    std::string text;
+    for (const auto& message : output.GetErrorMessages()) text += message + "; ";
+    return text + Shown(output.GetRootObject()) +
+           (output.IsComplete() ? ", complete" : ", incomplete");
+}
+
+std::vector<std::string> Elements(const std::shared_ptr<MetaObject>& list,
+                                  const std::string& field) {
+    auto l = std::dynamic_pointer_cast<MetaList>(list);
+    EXPECT_TRUE(l) << Shown(list) << " is not a list";
+    std::vector<std::string> elements;
+    for (const auto& element : l ? l->GetElements() : std::vector<std::shared_ptr<MetaObject>>()) {
+        auto row = std::dynamic_pointer_cast<MetaStruct>(element);
+        auto value = field.empty() ? element : row ? row->GetField(field) : nullptr;
+        EXPECT_TRUE(value) << "no field " << field << " in " << Shown(element);
+        elements.push_back(Shown(value));
+    }
+    return elements;
 }
 
 std::shared_ptr<Kalmor::CallSpec::Input> InputOf(const std::string& options) {

@@ -37,61 +37,74 @@ using HostCtl::Mesk::Uuid;
 using LunList = std::vector<std::shared_ptr<MeskDiskLun>>;
 using NicList = std::vector<std::unique_ptr<MeskZuvNicConfig2>>;
 
+// Every operation of the info object, once, as X(result, name, (parameters), (arguments)):
+// the mock and the proxies that commands get are both made from these lists.
+#define MESK_INFO_OPERATIONS(X)                                                            \
+    X(const MeskClusterConfig&, GetClusterConfig, (), ())                                  \
+    X(bool, IsWitness, (), ())                                                             \
+    X(MeskConfigGeneration, GetConfigGeneration, (), ())                                   \
+    X(void, JoinCluster, (const Uuid& a, bool b, const std::string& c, bool d, int32_t e), \
+      (a, b, c, d, e))                                                                     \
+    X(void, CreateCluster, (const std::string& a, bool b, bool c), (a, b, c))              \
+    X(void, LeaveCluster, (bool a), (a))                                                   \
+    X(void, RestoreClusterConfig, (bool a), (a))                                           \
+    X(void, SetPreferredFaultDomain, (const std::string& a), (a))                          \
+    X(void, GetUnicastWitnesses, (std::vector<std::string> & a), (a))                      \
+    X(void, AddUnicastAgent,                                                               \
+      (const std::string& a, bool b, bool c, const MeskIpAddress& d, int32_t e, bool f,    \
+       const std::string& g),                                                              \
+      (a, b, c, d, e, f, g))                                                               \
+    X(void, RefreshUnicastAgents, (), ())                                                  \
+    X(void, GetUnicastAgents, (std::vector<std::string> & a), (a))                         \
+    X(bool, RemoveUnicastAgent, (const std::string& a, const MeskIpAddress& b, int32_t c), \
+      (a, b, c))                                                                           \
+    X(bool, IsZuvNicInUse, (const std::string& a, const std::string& b), (a, b))           \
+    X(bool, RemoveZuvNic, (const std::string& a, bool b, const std::string& c), (a, b, c)) \
+    X(void, ClearNetworkConfig, (), ())                                                    \
+    X(void, RestoreNetworkConfig, (), ())                                                  \
+    X(void, GetMeskDiskUuids, (std::vector<Uuid> & a), (a))                                \
+    X(void, GetDiskInfo, (const Uuid& a, const LunList& b, MeskDiskInfo& c), (a, b, c))    \
+    X(void, AddDisks, (const std::string& a, const std::vector<std::string>& b), (a, b))   \
+    X(void, RemoveDisk, (const std::string& a, const std::string& b), (a, b))              \
+    X(void, RemoveDiskGroup, (const std::string& a, const std::string& b), (a, b))         \
+    X(void, RemoveDiskByUuid, (const std::string& a, const std::string& b), (a, b))        \
+    X(void, MountDiskGroup, (const std::string& a, bool b), (a, b))                        \
+    X(void, MountByUuid, (const std::string& a), (a))                                      \
+    X(void, MountDisk, (const std::string& a), (a))                                        \
+    X(void, UnmountDiskGroup, (const std::string& a, bool b), (a, b))                      \
+    X(void, UnmountDisk, (const std::string& a, bool b), (a, b))                           \
+    X(void, AddCapacityFlashTag, (const std::string& a), (a))                              \
+    X(void, RemoveCapacityFlashTag, (const std::string& a), (a))                           \
+    X(bool, GetAutoClaimMode, (), ())                                                      \
+    X(void, SetAutoClaimMode, (bool a), (a))                                               \
+    X(std::string, GetDatastoreName, (), ())                                               \
+    X(void, SetDatastoreName, (const std::string& a), (a))                                 \
+    X(std::string, GetFaultDomainName, (), ())                                             \
+    X(void, SetFaultDomainName, (const std::string& a), (a))                               \
+    X(void, ResetFaultDomainName, (), ())                                                  \
+    X(std::string, GetDefaultPolicy, (const std::string& a), (a))                          \
+    X(void, SetDefaultPolicy, (const std::string& a, const std::string& b), (a, b))        \
+    X(void, ClearDefaultPolicies, (), ())                                                  \
+    X(int64_t, GetResyncBandwidth, (), ())                                                 \
+    X(int64_t, GetResyncThrottle, (), ())                                                  \
+    X(void, SetResyncThrottle, (int64_t a), (a))
+#define MESK_INFO2_OPERATIONS(X)         \
+    X(NicList, GetZuvNicConfigs, (), ()) \
+    X(bool, SetZuvNicConfig, (const MeskZuvNicConfig2& a), (a))
+#define MESK_MOCK_OPERATION(result, name, parameters, arguments) \
+    MOCK_METHOD(result, name, parameters, (override));
+#define MESK_FORWARD_OPERATION(result, name, parameters, arguments) \
+    result name parameters override {                               \
+        return target_.name arguments;                              \
+    }
+
 class MockMeskInfo : public HostCtl::Mesk::MeskInfo2 {
   public:
     MockMeskInfo();
     ~MockMeskInfo() override;
 
-    MOCK_METHOD(const MeskClusterConfig&, GetClusterConfig, (), (override));
-    MOCK_METHOD(bool, IsWitness, (), (override));
-    MOCK_METHOD(MeskConfigGeneration, GetConfigGeneration, (), (override));
-    MOCK_METHOD(void, JoinCluster, (const Uuid&, bool, const std::string&, bool, int32_t),
-                (override));
-    MOCK_METHOD(void, CreateCluster, (const std::string&, bool, bool), (override));
-    MOCK_METHOD(void, LeaveCluster, (bool), (override));
-    MOCK_METHOD(void, RestoreClusterConfig, (bool), (override));
-    MOCK_METHOD(void, SetPreferredFaultDomain, (const std::string&), (override));
-    MOCK_METHOD(void, GetUnicastWitnesses, (std::vector<std::string>&), (override));
-    MOCK_METHOD(void, AddUnicastAgent,
-                (const std::string&, bool, bool, const MeskIpAddress&, int32_t, bool,
-                 const std::string&),
-                (override));
-    MOCK_METHOD(void, RefreshUnicastAgents, (), (override));
-    MOCK_METHOD(void, GetUnicastAgents, (std::vector<std::string>&), (override));
-    MOCK_METHOD(bool, RemoveUnicastAgent, (const std::string&, const MeskIpAddress&, int32_t),
-                (override));
-    MOCK_METHOD(bool, IsZuvNicInUse, (const std::string&, const std::string&), (override));
-    MOCK_METHOD(bool, RemoveZuvNic, (const std::string&, bool, const std::string&), (override));
-    MOCK_METHOD(void, ClearNetworkConfig, (), (override));
-    MOCK_METHOD(void, RestoreNetworkConfig, (), (override));
-    MOCK_METHOD(void, GetMeskDiskUuids, (std::vector<Uuid>&), (override));
-    MOCK_METHOD(void, GetDiskInfo, (const Uuid&, const LunList&, MeskDiskInfo&), (override));
-    MOCK_METHOD(void, AddDisks, (const std::string&, const std::vector<std::string>&), (override));
-    MOCK_METHOD(void, RemoveDisk, (const std::string&, const std::string&), (override));
-    MOCK_METHOD(void, RemoveDiskGroup, (const std::string&, const std::string&), (override));
-    MOCK_METHOD(void, RemoveDiskByUuid, (const std::string&, const std::string&), (override));
-    MOCK_METHOD(void, MountDiskGroup, (const std::string&, bool), (override));
-    MOCK_METHOD(void, MountByUuid, (const std::string&), (override));
-    MOCK_METHOD(void, MountDisk, (const std::string&), (override));
-    MOCK_METHOD(void, UnmountDiskGroup, (const std::string&, bool), (override));
-    MOCK_METHOD(void, UnmountDisk, (const std::string&, bool), (override));
-    MOCK_METHOD(void, AddCapacityFlashTag, (const std::string&), (override));
-    MOCK_METHOD(void, RemoveCapacityFlashTag, (const std::string&), (override));
-    MOCK_METHOD(bool, GetAutoClaimMode, (), (override));
-    MOCK_METHOD(void, SetAutoClaimMode, (bool), (override));
-    MOCK_METHOD(std::string, GetDatastoreName, (), (override));
-    MOCK_METHOD(void, SetDatastoreName, (const std::string&), (override));
-    MOCK_METHOD(std::string, GetFaultDomainName, (), (override));
-    MOCK_METHOD(void, SetFaultDomainName, (const std::string&), (override));
-    MOCK_METHOD(void, ResetFaultDomainName, (), (override));
-    MOCK_METHOD(std::string, GetDefaultPolicy, (const std::string&), (override));
-    MOCK_METHOD(void, SetDefaultPolicy, (const std::string&, const std::string&), (override));
-    MOCK_METHOD(void, ClearDefaultPolicies, (), (override));
-    MOCK_METHOD(int64_t, GetResyncBandwidth, (), (override));
-    MOCK_METHOD(int64_t, GetResyncThrottle, (), (override));
-    MOCK_METHOD(void, SetResyncThrottle, (int64_t), (override));
-    MOCK_METHOD(NicList, GetZuvNicConfigs, (), (override));
-    MOCK_METHOD(bool, SetZuvNicConfig, (const MeskZuvNicConfig2&), (override));
+    MESK_INFO_OPERATIONS(MESK_MOCK_OPERATION)
+    MESK_INFO2_OPERATIONS(MESK_MOCK_OPERATION)
 
     // What GetClusterConfig returns by default: not enabled, no UUID.
     MeskClusterConfig clusterConfig;
@@ -169,23 +182,68 @@ inline auto Fail(const std::string& message) {
     return ::testing::Throw(HostCtl::Lib::Mesk::MeskCtlException(message));
 }
 
+// An argument of a recorded call as text: a string as it is, a list of strings joined by
+// ",", an address as "v4:" or "v6:" and its text, a UUID in text form, an interface record as
+// its name, agent and master groups (IPv4, IPv6), agent, master and unicast ports, TTL, traffic
+// types and (only when there are any) options in parentheses; anything else as GoogleTest
+// prints it.
+std::string Arg(const std::string& text);
+std::string Arg(const std::vector<std::string>& texts);
+std::string Arg(const MeskIpAddress& address);
+std::string Arg(const Uuid& uuid);
+std::string Arg(const MeskZuvNicConfig2& nic);
+template <class T>
+std::string Arg(const T& value) {
+    return ::testing::PrintToString(value);
+}
+
 // Base fixture of the command tests: installs the double for the test's lifetime.
 class HostTest : public ::testing::Test {
   protected:
     HostTest();
     ~HostTest() override;
 
-    // Runs the command's ExecuteInternal with that input; returns the output.
-    std::shared_ptr<Kalmor::CallSpec::Output> Run(
-        Kalmor::AutoCli::Command& command,
-        std::shared_ptr<Kalmor::CallSpec::Input> input = Kalmor::CallSpec::Input::New());
+    // Runs the command's ExecuteInternal with that input, or with the options written as
+    // "name=value name=value" (a list option once per value, a flag as its bare name);
+    // returns the output.
+    std::shared_ptr<Kalmor::CallSpec::Output> Run(Kalmor::AutoCli::Command& command,
+                                                  std::shared_ptr<Kalmor::CallSpec::Input> input);
+    std::shared_ptr<Kalmor::CallSpec::Output> Run(Kalmor::AutoCli::Command& command,
+                                                  const std::string& options = "");
 
     // Sets whether the host is enabled in a cluster, as GetClusterConfig reports it.
     void SetEnabled(bool enabled, const std::string& clusterUuid = "");
 
+    // An action for any operation of the double: appends the call to `calls` as
+    // "Name(argument, ...)", then throws MeskCtlException(failure) if `failure` is set, or
+    // returns the answer if one is given.
+    template <class... Answer>
+    auto Record(const std::string& name, Answer... answer) {
+        return [this, name, answer...](const auto&... args) {
+            std::string call;
+            ((call += (call.empty() ? "" : ", ") + Arg(args)), ...);
+            calls += (calls.empty() ? "" : " ") + name + "(" + call + ")";
+            if (!failure.empty()) throw HostCtl::Lib::Mesk::MeskCtlException(failure);
+            return (answer, ...);
+        };
+    }
+    std::string calls, failure;
+
     ::testing::NiceMock<MockMeskInfo> info;
     ::testing::NiceMock<MockHost> host{info};
 };
+
+// A result value as text: a structure as {name=value, ...} in field order, a list as
+// [element, ...], a value never set as null, no object at all as "no result".
+std::string Shown(const std::shared_ptr<Kalmor::MetaObj::MetaObject>& value);
+// What a run handed back, as one line: each error message followed by "; ", then the result
+// as Shown, then ", complete" or ", incomplete". For example "true, complete", or
+// "Unable to mount: busy; no result, incomplete".
+std::string Outcome(const Kalmor::CallSpec::Output& output);
+// The elements of a list, each as Shown, or one field of each; fails the test when `list` is
+// not a list of structures with that field.
+std::vector<std::string> Elements(const std::shared_ptr<Kalmor::MetaObj::MetaObject>& list,
+                                  const std::string& field = "");
 
 // A command's input from options written as "name=value name=value"; a list option is given
 // once per value.
