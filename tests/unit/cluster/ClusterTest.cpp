@@ -2,8 +2,6 @@
 #include <cstdlib>
 #include <cstring>
 #include <ctime>
-#include <string>
-#include <vector>
 
 #include "MockHost.h"
 #include "commands/cluster/ClusterGet.h"
@@ -19,21 +17,17 @@ namespace OrvaneCli {
 namespace MeskNamespace {
 namespace {
 
-using namespace Kalmor::MetaObj;
-using namespace MeskTest;
 using Kalmor::CallSpec::Input;
+using namespace MeskTest;
 using ::testing::_;
 using ::testing::DoAll;
-using ::testing::ElementsAre;
 using ::testing::Invoke;
-using ::testing::IsEmpty;
 using ::testing::Return;
 using ::testing::SetArgReferee;
+using ClusterTest = HostTest;
 
 const char kUuid[] = "52a1c3e4-1b2c-4d3e-8f90-a1b2c3d4e5f6";
-const char kInCluster[] =
-    "The host is in a Mesk cluster and enabled for Mesk. You need to remove it from the cluster "
-    "or disable Mesk.";
+const std::string kNone = "; no result, incomplete";
 
 std::string Repeat(const std::string& piece, size_t count) {
     std::string text;
@@ -41,49 +35,20 @@ std::string Repeat(const std::string& piece, size_t count) {
     return text;
 }
 
-// A boolean answer: true or false, with the output complete and no error.
-void ExpectAnswered(const Kalmor::CallSpec::Output& output, bool result) {
-    EXPECT_THAT(Errors(output), IsEmpty());
-    EXPECT_TRUE(BoolResult(output) == result && output.IsComplete());
+MeskConfigGeneration Generation(const std::string& uuid, uint64_t number, uint64_t timestamp) {
+    MeskConfigGeneration generation;
+    generation.uuid = uuid, generation.generation = number, generation.timestamp = timestamp;
+    return generation;
 }
 
-class ClusterTest : public HostTest {
-  protected:
-    // Checks and drops the expectations so far; the default answers stay.
-    void Settle() {
-        ::testing::Mock::VerifyAndClearExpectations(&host);
-        ::testing::Mock::VerifyAndClearExpectations(&info);
-    }
-};
-
-// Every field of a cluster report as text, in order; an empty value shows as "-".
-std::vector<std::string> Shown(const std::shared_ptr<MetaObject>& root) {
-    std::vector<std::string> shown;
-    for (const auto& field : std::dynamic_pointer_cast<MetaStruct>(root)->GetFields()) {
-        std::string text;
-        if (auto s = std::dynamic_pointer_cast<MetaString>(field.value); s && s->HasValue()) {
-            text = s->GetValue();
-        } else if (auto i = std::dynamic_pointer_cast<MetaInt>(field.value); i && i->HasValue()) {
-            text = std::to_string(i->GetValue());
-        } else if (auto b = std::dynamic_pointer_cast<MetaBool>(field.value); b && b->HasValue()) {
-            text = b->GetValue() ? "true" : "false";
-        } else if (auto l = std::dynamic_pointer_cast<MetaList>(field.value)) {
-            for (const auto& element : l->GetElements()) {
-                text += (text.empty() ? "" : ",") +
-                        std::dynamic_pointer_cast<MetaString>(element)->GetValue();
-            }
-        }
-        shown.push_back(field.name + "=" + (text.empty() ? "-" : text));
-    }
-    return shown;
-}
-
-class ClusterGetTest : public ClusterTest {
+// A witness host in the cluster kUuid; each field of the report has a source of its own.
+class ClusterGetTest : public HostTest {
   protected:
     ClusterGetTest() {
         setenv("TZ", "UTC", 1);
         tzset();
         SetEnabled(true, kUuid);
+        ON_CALL(info, IsWitness()).WillByDefault(Return(true));
         ON_CALL(host, GetInfoFromKOVRA(_, _, _, _, _, _, _, _, _))
             .WillByDefault(Invoke([](std::vector<MeskMemberInfo>& members, std::string& state,
                                      std::string& uuid, std::string& health, uint64_t& revision,
@@ -98,31 +63,35 @@ class ClusterGetTest : public ClusterTest {
         ON_CALL(info, GetConfigGeneration()).WillByDefault(Return(Generation("g", 9, 0)));
     }
     ~ClusterGetTest() override { unsetenv("TZ"); }
-
-    static MeskConfigGeneration Generation(const std::string& uuid, uint64_t number,
-                                           uint64_t timestamp) {
-        MeskConfigGeneration generation;
-        generation.uuid = uuid, generation.generation = number, generation.timestamp = timestamp;
-        return generation;
-    }
 };
 
-TEST_F(ClusterGetTest, MemberHostReportsEachFieldFromItsSourceInTemplateOrder) {
-    ON_CALL(info, IsWitness()).WillByDefault(Return(true));
-    auto output = Run(*ClusterGet::New());
-    EXPECT_TRUE(Errors(*output).empty() && output->IsComplete());
-    EXPECT_THAT(
-        Shown(output->GetRootObject()),
-        ElementsAre("Enabled=true", "Current Local Time=now", "Local Node UUID=local",
-                    "Local Node Type=WITNESS", "Local Node State=AGENT",
-                    "Local Node Health State=Healthy", "Sub-Cluster Master UUID=master",
-                    "Sub-Cluster Backup UUID=backup", std::string("Sub-Cluster UUID=") + kUuid,
-                    "Sub-Cluster Membership Entry Revision=42", "Sub-Cluster Member Count=2",
-                    "Sub-Cluster Member UUIDs=member-a,member-b", "Sub-Cluster Membership UUID=ms",
-                    "Unicast Mode Enabled=true", "Maintenance Mode State=OFF",
-                    "Config Generation=g 9 0.000"));
+// Unlike most commands, a failure still gives the report, complete, with the fields set
+// before it and the message unprefixed.
+TEST_F(ClusterGetTest, ReportsEachFieldFromItsSourceOrTheFieldsSoFar) {
+    EXPECT_EQ(Outcome(*Run(*ClusterGet::New())),
+              std::string("{Enabled=true, Current Local Time=now, Local Node UUID=local, "
+                          "Local Node Type=WITNESS, Local Node State=AGENT, "
+                          "Local Node Health State=Healthy, Sub-Cluster Master UUID=master, "
+                          "Sub-Cluster Backup UUID=backup, Sub-Cluster UUID=") +
+                  kUuid +
+                  ", Sub-Cluster Membership Entry Revision=42, Sub-Cluster Member Count=2, "
+                  "Sub-Cluster Member UUIDs=[member-a, member-b], "
+                  "Sub-Cluster Membership UUID=ms, Unicast Mode Enabled=true, "
+                  "Maintenance Mode State=OFF, Config Generation=g 9 0.000}, complete");
+    // Outside a cluster, the report as declared, nothing set.
+    const std::string unset = Shown(ClusterGet::New()->GetOutputStructure()) + ", complete";
+    // The clock is read while the fields are set, after Enabled.
+    std::string afterClock = unset;
+    afterClock.replace(afterClock.find("Enabled=null"), 12, "Enabled=true");
+    EXPECT_CALL(host, GetFormattedSystemDateTime()).WillOnce(Fail("boom"));
+    EXPECT_EQ(Outcome(*Run(*ClusterGet::New())), "boom; " + afterClock);
+    SetEnabled(false);
+    EXPECT_EQ(Outcome(*Run(*ClusterGet::New())),
+              "Mesk Clustering is not enabled on this host; " + unset);
 }
 
+// The generation's UUID ("None" when empty), number and timestamp in local time; below one
+// second no date at all.
 TEST_F(ClusterGetTest, ConfigGenerationShowsUuidNumberAndLocalTimestamp) {
     const struct {
         const char* zone;
@@ -132,7 +101,6 @@ TEST_F(ClusterGetTest, ConfigGenerationShowsUuidNumberAndLocalTimestamp) {
         {"UTC", Generation("", 0, 0), "None 0 0.000"},
         {"UTC", Generation("u", UINT64_MAX, 1500000000007),
          "u 18446744073709551615 2017-07-14T02:40:00.007"},
-        // Local time; below one second no date at all.
         {"XYZ-2", Generation("u", 1, 1500000000120), "u 1 2017-07-14T04:40:00.120"},
         {"XYZ-2", Generation("u", 1, 5), "u 1 0.005"},
     };
@@ -140,215 +108,173 @@ TEST_F(ClusterGetTest, ConfigGenerationShowsUuidNumberAndLocalTimestamp) {
         setenv("TZ", c.zone, 1);
         tzset();
         EXPECT_CALL(info, GetConfigGeneration()).WillOnce(Return(c.generation));
-        auto output = Run(*ClusterGet::New());
-        EXPECT_EQ(TextField(output->GetRootObject(), "Config Generation"), c.expected);
+        EXPECT_THAT(Outcome(*Run(*ClusterGet::New())),
+                    ::testing::HasSubstr("Config Generation=" + c.expected + "}"));
     }
 }
 
-// Unlike most commands, a failure still gives the report, complete, with the fields set
-// before it (all are set together, after the queries) and the message unprefixed.
-TEST_F(ClusterGetTest, FailureStillGivesACompleteReportWithTheFieldsSoFar) {
-    EXPECT_CALL(host, GetFormattedSystemDateTime()).WillOnce(Fail("boom"));
-    auto output = Run(*ClusterGet::New());
-    EXPECT_THAT(Errors(*output), ElementsAre("boom"));
-    EXPECT_TRUE(output->IsComplete());
-    auto shown = Shown(output->GetRootObject());
-    ASSERT_EQ(shown.size(), 16u);
-    EXPECT_EQ(shown[0], "Enabled=true");
-    for (size_t i = 1; i < shown.size(); ++i) EXPECT_EQ(shown[i].back(), '-') << shown[i];
-}
-
-// A join's options as the framework parses them; `domain` nullptr: option not given.
-std::shared_ptr<Input> JoinInput(bool witness, const char* domain, bool wait = false) {
-    auto input = Input::New();
-    input->SetParameter("cluster-uuid", kUuid);
-    if (witness) input->SetFlag("witness-node");
-    if (domain) input->SetParameter("witness-preferred-fault-domain", domain);
-    if (wait) input->SetFlag("wait");
-    return input;
-}
-
-TEST_F(ClusterTest, JoinRefusalsComeInOrderAndNeverJoin) {
-    const std::string tooLong = Repeat("\xc3\xa9", 257);
+// The witness options are checked in this order, the domain's length in characters; a library
+// failure is reported bare, with a false result that is complete.
+TEST_F(ClusterTest, JoinChecksTheWitnessOptionsThenJoins) {
+    ON_CALL(info, JoinCluster(_, _, _, _, _)).WillByDefault(Record("JoinCluster"));
+    const std::string empty =
+        "Preferred fault domain name cannot be empty or exceed 256 characters.";
+    const std::string accents256 = Repeat("\xc3\xa9", 256), accents257 = accents256 + "x";
+    const std::string joined = std::string("JoinCluster(") + kUuid;
     const struct {
-        bool witness;
-        const char* domain;
-        std::string message;
+        std::string options, calls, outcome;
     } cases[] = {
-        {true, nullptr,
+        {"wait", joined + ", false, , true, 0)", "true, complete"},
+        {"witness-node witness-preferred-fault-domain=" + accents256,
+         joined + ", true, " + accents256 + ", false, 0)", "true, complete"},
+        {"witness-node", "",
          "If --witness-node is specified, --witness-preferred-fault-domain must also be "
-         "specified."},
-        {true, "", "Preferred fault domain name cannot be empty or exceed 256 characters."},
-        {true, tooLong.c_str(),
-         "Preferred fault domain name cannot be empty or exceed 256 characters."},
-        {false, "",
-         "--witness-preferred-fault-domain is valid only when --witness-node is specified."},
+         "specified." +
+             kNone},
+        {"witness-node witness-preferred-fault-domain=", "", empty + kNone},
+        {"witness-node witness-preferred-fault-domain=" + accents257, "", empty + kNone},
+        {"witness-preferred-fault-domain=", "",
+         "--witness-preferred-fault-domain is valid only when --witness-node is specified." +
+             kNone},
     };
-    EXPECT_CALL(info, JoinCluster(_, _, _, _, _)).Times(0);
     for (const auto& c : cases) {
-        ExpectRefused(*Run(*ClusterJoin::New(), JoinInput(c.witness, c.domain)), c.message);
+        calls.clear();
+        EXPECT_EQ(Outcome(*Run(*ClusterJoin::New(),
+                               std::string("cluster-uuid=") + kUuid + " " + c.options)),
+                  c.outcome);
+        EXPECT_EQ(calls, c.calls);
     }
+    failure = "bad uuid";
+    EXPECT_EQ(Outcome(*Run(*ClusterJoin::New(), std::string("cluster-uuid=") + kUuid)),
+              "bad uuid; false, complete");
+    // An enabled host is refused before its options are looked at.
+    SetEnabled(true);
+    EXPECT_EQ(Outcome(*Run(*ClusterJoin::New(), "cluster-uuid=x witness-node")),
+              "The host is in a Mesk cluster and enabled for Mesk. You need to remove it from the "
+              "cluster or disable Mesk." +
+                  kNone);
 }
 
-TEST_F(ClusterTest, JoinPassesOptionsOnAndCountsCharactersNotBytes) {
-    const std::string ascii256 = Repeat("x", 256), twoByte200 = Repeat("\xc3\xa9", 200);
-    for (const char* domain : {"", "site-a", ascii256.c_str(), twoByte200.c_str()}) {
-        const bool witness = *domain != '\0', wait = !witness;
-        EXPECT_CALL(info, JoinCluster(UuidOf(kUuid), witness, domain, wait, 0));
-        ExpectAnswered(
-            *Run(*ClusterJoin::New(), JoinInput(witness, witness ? domain : nullptr, wait)), true);
-        Settle();
-    }
-    // A library failure is reported bare, with a false result that is complete.
-    EXPECT_CALL(info, JoinCluster(_, _, _, _, _)).WillOnce(Fail("bad uuid"));
-    auto output = Run(*ClusterJoin::New(), JoinInput(false, nullptr));
-    EXPECT_THAT(Errors(*output), ElementsAre("bad uuid"));
-    EXPECT_TRUE(!BoolResult(*output) && output->IsComplete());
-}
-
+// The cluster is named by the random UUID packed in place; a failed creation says what it was
+// doing, with a false result that is complete.
 TEST_F(ClusterTest, NewCreatesTheClusterNamedByThePackedUuid) {
-    EXPECT_CALL(host, UUID_CreateRandom()).WillOnce(Invoke([] {
+    ON_CALL(host, UUID_CreateRandom()).WillByDefault(Invoke([] {
         return strdup("6F9619FF-8B86-D011-B42D-00C04FC964FF");
     }));
-    EXPECT_CALL(host, UUID_PackText(_, _, 36))
-        .WillOnce(Invoke([](const char* text, char* buffer, size_t length) {
-            EXPECT_EQ(text, buffer);  // packed in place
+    ON_CALL(host, UUID_PackText(_, _, 36))
+        .WillByDefault(Invoke([](const char* text, char* buffer, size_t length) {
+            EXPECT_EQ(text, buffer);
             for (size_t i = 0; i < length; ++i) buffer[i] = std::tolower(buffer[i]);
             return buffer;
         }));
-    EXPECT_CALL(info, CreateCluster("6f9619ff-8b86-d011-b42d-00c04fc964ff", true, false));
-    ExpectAnswered(*Run(*ClusterNew::New()), true);
-}
+    ON_CALL(info, CreateCluster(_, _, _)).WillByDefault(Record("CreateCluster"));
+    EXPECT_EQ(Outcome(*Run(*ClusterNew::New())), "true, complete");
+    EXPECT_EQ(calls, "CreateCluster(6f9619ff-8b86-d011-b42d-00c04fc964ff, true, false)");
+    failure = "boom";
+    EXPECT_EQ(Outcome(*Run(*ClusterNew::New())),
+              "Unable to create the new Mesk cluster: boom; false, complete");
 
-TEST_F(ClusterTest, NewRefusalsCreateNothingAndFailuresArePrefixedAndFalse) {
-    // Only the last run gets as far as creating.
-    EXPECT_CALL(info, CreateCluster(_, _, _)).WillOnce(Fail("boom"));
+    calls.clear();
+    EXPECT_CALL(host, UUID_CreateRandom()).WillOnce(Return(nullptr));
+    EXPECT_EQ(Outcome(*Run(*ClusterNew::New())), "Unable to generate a UUID" + kNone);
     SetEnabled(true);
-    ExpectRefused(*Run(*ClusterNew::New()), kInCluster);
-    SetEnabled(false);
-    EXPECT_CALL(host, UUID_CreateRandom())
-        .WillOnce(Return(nullptr))
-        .WillOnce(::testing::DoDefault());
-    ExpectRefused(*Run(*ClusterNew::New()), "Unable to generate a UUID");
-    auto output = Run(*ClusterNew::New());
-    EXPECT_THAT(Errors(*output), ElementsAre("Unable to create the new Mesk cluster: boom"));
-    EXPECT_TRUE(!BoolResult(*output) && output->IsComplete());
+    EXPECT_EQ(Outcome(*Run(*ClusterNew::New())),
+              "The host is in a Mesk cluster and enabled for Mesk. You need to remove it from the "
+              "cluster or disable Mesk." +
+                  kNone);
+    EXPECT_EQ(calls, "");
 }
 
 const std::string kScript = "/usr/lib/orvane/tavord/bin/notifyDatastore.py";
 const std::string kPreUnmount = kScript + " -t PreUnmount -d meskDatastore";
 const std::string kFailedUnmount = kScript + " -t FailedUnmount -d meskDatastore";
 
-// Records each shell command line instead of running it; the script always fails.
-class ClusterLeaveTest : public ClusterTest {
-  protected:
-    ClusterLeaveTest() {
-        unsetenv("MESK_HOST_ROOT");
-        Kalmor::AutoCli::SetShellCmdHook(
-            [this](const std::string& command, std::string& output, const std::string&) {
-                commands.push_back(command);
-                output = "Traceback";
-                return 1;
-            });
-    }
-    ~ClusterLeaveTest() override { Kalmor::AutoCli::SetShellCmdHook(nullptr); }
-
-    std::vector<std::string> commands;
-};
-
-TEST_F(ClusterLeaveTest, LeaveNotifiesAroundTheLeaveAndIgnoresTheScriptsFailure) {
+// The unmount is announced before the host leaves, and taken back when the leave fails; the
+// script's own failure (here always) changes nothing. A failed leave leaves no result.
+TEST_F(ClusterTest, LeaveNotifiesAroundTheLeave) {
+    unsetenv("MESK_HOST_ROOT");
+    Kalmor::AutoCli::SetShellCmdHook(
+        [this](const std::string& command, std::string& output, const std::string&) {
+            calls += (calls.empty() ? "" : " ") + command;
+            output = "Traceback";
+            return 1;
+        });
+    ON_CALL(info, LeaveCluster(_)).WillByDefault(Record("LeaveCluster"));
     const struct {
-        bool enabled, leaveFails;
-        std::string message;  // empty: success
-        std::vector<std::string> notifications;
+        bool enabled;
+        std::string failure, calls, outcome;
     } cases[] = {
-        {true, false, "", {kPreUnmount}},
-        {false, false, "The host is not in a Mesk cluster.", {}},
-        {true, true, "boom", {kPreUnmount, kFailedUnmount}},
+        {true, "", kPreUnmount + " LeaveCluster(false)", "true, complete"},
+        {true, "boom", kPreUnmount + " LeaveCluster(false) " + kFailedUnmount, "boom" + kNone},
+        {false, "", "", "The host is not in a Mesk cluster." + kNone},
     };
     for (const auto& c : cases) {
         SetEnabled(c.enabled);
-        commands.clear();
-        // The unmount is announced before the host leaves.
-        EXPECT_CALL(info, LeaveCluster(false))
-            .Times(c.enabled ? 1 : 0)
-            .WillRepeatedly(Invoke([this, &c](bool) {
-                EXPECT_THAT(commands, ElementsAre(kPreUnmount));
-                if (c.leaveFails) throw HostCtl::Lib::Mesk::MeskCtlException("boom");
-            }));
-        auto output = Run(*ClusterLeave::New());
-        EXPECT_EQ(commands, c.notifications);
-        if (c.message.empty()) {
-            ExpectAnswered(*output, true);
-        } else {
-            ExpectRefused(*output, c.message);
-        }
-        Settle();
+        calls.clear(), failure = c.failure;
+        EXPECT_EQ(Outcome(*Run(*ClusterLeave::New())), c.outcome);
+        EXPECT_EQ(calls, c.calls);
     }
+    Kalmor::AutoCli::SetShellCmdHook(nullptr);
 }
 
-TEST_F(ClusterTest, RestorePassesTheBootFlagAndIsFalseAfterAFailure) {
+// Restore passes the boot flag on without asking whether the host is in a cluster; a failure
+// is reported bare, with a false result that is complete.
+TEST_F(ClusterTest, RestorePassesTheBootFlagOn) {
+    ON_CALL(info, RestoreClusterConfig(_)).WillByDefault(Record("RestoreClusterConfig"));
     EXPECT_CALL(info, GetClusterConfig()).Times(0);
-    EXPECT_CALL(info, RestoreClusterConfig(false));
-    ExpectAnswered(*Run(*ClusterRestore::New()), true);
-    EXPECT_CALL(info, RestoreClusterConfig(true)).WillOnce(Fail("no config"));
-    auto input = Input::New();
-    input->SetFlag("boot");
-    auto output = Run(*ClusterRestore::New(), input);
-    EXPECT_THAT(Errors(*output), ElementsAre("no config"));
-    EXPECT_TRUE(!BoolResult(*output) && output->IsComplete());
+    EXPECT_EQ(Outcome(*Run(*ClusterRestore::New())), "true, complete");
+    failure = "no config";
+    EXPECT_EQ(Outcome(*Run(*ClusterRestore::New(), "boot")), "no config; false, complete");
+    EXPECT_EQ(calls, "RestoreClusterConfig(false) RestoreClusterConfig(true)");
 }
 
+// Only in a stretched cluster; outside any cluster stretching is not even asked. The library
+// fills the id first, then the name; both are shown as given.
 TEST_F(ClusterTest, PreferredFaultDomainGetAnswersOnlyInAStretchedCluster) {
     SetEnabled(true);
     ON_CALL(host, IsInStretchedCluster()).WillByDefault(Return(true));
-    // The library fills the id first, then the name; both are shown as given.
     ON_CALL(host, GetPreferredFaultDomainInfo(_, _))
         .WillByDefault(DoAll(SetArgReferee<0>("id-1"), SetArgReferee<1>(" Site A ")));
-    auto output = Run(*ClusterPreferredFaultDomainGet::New());
-    EXPECT_TRUE(Errors(*output).empty() && output->IsComplete());
-    EXPECT_EQ(TextField(output->GetRootObject(), "Preferred Fault Domain Name"), " Site A ");
-    EXPECT_EQ(TextField(output->GetRootObject(), "Preferred Fault Domain Id"), "id-1");
+    EXPECT_EQ(Outcome(*Run(*ClusterPreferredFaultDomainGet::New())),
+              "{Preferred Fault Domain Name= Site A , Preferred Fault Domain Id=id-1}, complete");
 
     EXPECT_CALL(host, GetPreferredFaultDomainInfo(_, _)).WillOnce(Fail("boom"));
-    ExpectRefused(*Run(*ClusterPreferredFaultDomainGet::New()),
-                  "Unable to get preferred fault domain name: boom");
-    // Not stretched, or not in a cluster at all (then stretching is not even asked).
+    EXPECT_EQ(Outcome(*Run(*ClusterPreferredFaultDomainGet::New())),
+              "Unable to get preferred fault domain name: boom" + kNone);
     const std::string notStretched =
-        "Cannot get preferred fault domain if host is not in a stretched cluster.";
+        "Cannot get preferred fault domain if host is not in a stretched cluster." + kNone;
     EXPECT_CALL(host, IsInStretchedCluster()).WillOnce(Return(false));
-    ExpectRefused(*Run(*ClusterPreferredFaultDomainGet::New()), notStretched);
+    EXPECT_EQ(Outcome(*Run(*ClusterPreferredFaultDomainGet::New())), notStretched);
     SetEnabled(false);
-    ExpectRefused(*Run(*ClusterPreferredFaultDomainGet::New()), notStretched);
+    EXPECT_EQ(Outcome(*Run(*ClusterPreferredFaultDomainGet::New())), notStretched);
 }
 
-TEST_F(ClusterTest, PreferredFaultDomainSetChecksTheNameBeforeTheRoleAndCountsCharacters) {
-    const std::string notWitness =
-        "Cannot set preferred fault domain if the host is not a witness node.";
+// The name is checked before the host's role, its length in characters.
+TEST_F(ClusterTest, PreferredFaultDomainSetChecksTheNameBeforeTheRole) {
+    ON_CALL(info, SetPreferredFaultDomain(_)).WillByDefault(Record("SetPreferredFaultDomain"));
+    const std::string euros256 = Repeat("\xe2\x82\xac", 256), euros257 = euros256 + "x";
     const struct {
         std::string name;
         bool witness;
-        std::string message;  // empty: set
+        std::string failure;
+        bool sets;
+        std::string outcome;
     } cases[] = {
-        {"", false, "Cannot set preferred fault domain name as empty."},
-        {Repeat("\xe2\x82\xac", 256), false, notWitness},  // 768 bytes pass
-        {Repeat("x", 256), true, ""},
-        {"site-a", true, "Unable to set preferred fault domain name: boom"},
+        {"", true, "", false, "Cannot set preferred fault domain name as empty." + kNone},
+        {euros257, true, "", false,
+         "Preferred Fault domain name cannot exceed 256 characters." + kNone},
+        {euros256, false, "", false,
+         "Cannot set preferred fault domain if the host is not a witness node." + kNone},
+        {euros256, true, "", true, "true, complete"},
+        {"site-a", true, "boom", true, "Unable to set preferred fault domain name: boom" + kNone},
     };
     for (const auto& c : cases) {
         ON_CALL(host, IsWitnessNode()).WillByDefault(Return(c.witness));
-        const bool sets = c.witness && c.name.size() <= 256;
-        auto& set = EXPECT_CALL(info, SetPreferredFaultDomain(c.name)).Times(sets ? 1 : 0);
-        if (c.name == "site-a") set.WillOnce(Fail("boom"));
-        auto input = Input::New();
-        input->SetParameter("preferred-fault-domain-name", c.name);
-        auto output = Run(*ClusterPreferredFaultDomainSet::New(), input);
-        if (c.message.empty()) {
-            ExpectAnswered(*output, true);
-        } else {
-            ExpectRefused(*output, c.message);
-        }
-        Settle();
+        calls.clear(), failure = c.failure;
+        EXPECT_EQ(Outcome(*Run(*ClusterPreferredFaultDomainSet::New(),
+                               "preferred-fault-domain-name=" + c.name)),
+                  c.outcome);
+        EXPECT_EQ(calls, c.sets ? "SetPreferredFaultDomain(" + c.name + ")" : "");
     }
 }
 
