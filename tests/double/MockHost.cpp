@@ -45,7 +45,6 @@ class ExtendedInfo : public InfoForward<HostCtl::Mesk::MeskInfo2> {
 class FakePlugin : public HostCtl::MeskPlugin {
   public:
     FakePlugin(MockHost& host, MockMeskInfo& info) : host_(host), info_(info) {}
-    ~FakePlugin() override { ++host_.pluginsReleased; }
 
     std::unique_ptr<HostCtl::Mesk::MeskInfo> GetMeskInfo() override {
         switch (host_.infoKind) {
@@ -75,23 +74,17 @@ MockMeskInfo::MockMeskInfo() {
 
 MockMeskInfo::~MockMeskInfo() = default;
 
-MockHost::MockHost(MockMeskInfo& info) : info_(info) {
+MockHost::MockHost(MockMeskInfo& info) {
     using Base = HostCtlSim::HostBackend;
-    ON_CALL(*this, GetMeskPlugin()).WillByDefault(Invoke([this] { return MakePlugin(); }));
+    ON_CALL(*this, GetMeskPlugin()).WillByDefault(Invoke([this, &info] {
+        ++pluginsMade;
+        return std::unique_ptr<HostCtl::MeskPlugin>(std::make_unique<FakePlugin>(*this, info));
+    }));
     ON_CALL(*this, GetFormattedSystemDateTime()).WillByDefault(Invoke([] {
         return std::string("2026-11-22 10:00:00");
     }));
     ON_CALL(*this, StringToMeskUuid(_)).WillByDefault(Invoke([this](const std::string& t) {
         return Base::StringToMeskUuid(t);
-    }));
-    ON_CALL(*this, MeskUuidToString(_)).WillByDefault(Invoke([this](const Uuid& u) {
-        return Base::MeskUuidToString(u);
-    }));
-    ON_CALL(*this, UTF8StringCharLength(_)).WillByDefault(Invoke([this](const std::string& t) {
-        return Base::UTF8StringCharLength(t);
-    }));
-    ON_CALL(*this, StringToMeskPolicyClass(_)).WillByDefault(Invoke([this](const std::string& n) {
-        return Base::StringToMeskPolicyClass(n);
     }));
     ON_CALL(*this, MeskPolicyClassToString(_)).WillByDefault(Invoke([this](MeskPolicyClass c) {
         return Base::MeskPolicyClassToString(c);
@@ -109,11 +102,6 @@ MockHost::MockHost(MockMeskInfo& info) : info_(info) {
 }
 
 MockHost::~MockHost() = default;
-
-std::unique_ptr<HostCtl::MeskPlugin> MockHost::MakePlugin() {
-    ++pluginsMade;
-    return std::make_unique<FakePlugin>(*this, info_);
-}
 
 Uuid UuidOf(const std::string& text) {
     return HostCtlSim::CurrentBackend().HostBackend::StringToMeskUuid(text);
@@ -158,13 +146,6 @@ HostTest::~HostTest() {
     HostCtlSim::SetBackend(nullptr);
 }
 
-std::shared_ptr<Kalmor::CallSpec::Output> HostTest::Run(
-    Kalmor::AutoCli::Command& command, std::shared_ptr<Kalmor::CallSpec::Input> input) {
-    auto output = Kalmor::CallSpec::Output::New();
-    command.ExecuteInternal(input, output);
-    return output;
-}
-
 std::shared_ptr<Kalmor::CallSpec::Output> HostTest::Run(Kalmor::AutoCli::Command& command,
                                                         const std::string& options) {
     auto input = Kalmor::CallSpec::Input::New();
@@ -177,7 +158,9 @@ std::shared_ptr<Kalmor::CallSpec::Output> HostTest::Run(Kalmor::AutoCli::Command
             input->AddParameterValue(word.substr(0, equals), word.substr(equals + 1));
         }
     }
-    return Run(command, input);
+    auto output = Kalmor::CallSpec::Output::New();
+    command.ExecuteInternal(input, output);
+    return output;
 }
 
 void HostTest::SetEnabled(bool enabled, const std::string& clusterUuid) {
@@ -223,77 +206,6 @@ std::vector<std::string> Elements(const std::shared_ptr<MetaObject>& list,
         elements.push_back(Shown(value));
     }
     return elements;
-}
-
-std::shared_ptr<Kalmor::CallSpec::Input> InputOf(const std::string& options) {
-    auto input = Kalmor::CallSpec::Input::New();
-    std::istringstream words(options);
-    for (std::string word; words >> word;) {
-        const size_t equals = word.find('=');
-        input->AddParameterValue(word.substr(0, equals), word.substr(equals + 1));
-    }
-    return input;
-}
-
-std::vector<std::string> Errors(const Kalmor::CallSpec::Output& output) {
-    return output.GetErrorMessages();
-}
-
-void ExpectRefused(const Kalmor::CallSpec::Output& output, const std::string& message) {
-    EXPECT_THAT(Errors(output), ::testing::ElementsAre(message));
-    EXPECT_TRUE(output.GetRootObject() == nullptr && !output.IsComplete());
-}
-
-bool BoolResult(const Kalmor::CallSpec::Output& output) {
-    auto value = std::dynamic_pointer_cast<MetaBool>(output.GetRootObject());
-    EXPECT_TRUE(value && value->HasValue()) << "the result is not a set boolean";
-    return value && value->GetValue();
-}
-
-namespace {
-std::shared_ptr<MetaObject> FieldOf(const std::shared_ptr<MetaObject>& structure,
-                                    const std::string& field) {
-    auto s = std::dynamic_pointer_cast<MetaStruct>(structure);
-    EXPECT_TRUE(s) << "not a structure";
-    if (!s) return nullptr;
-    auto value = s->GetField(field);
-    EXPECT_TRUE(value) << "no field " << field;
-    return value;
-}
-}  // namespace
-
-std::string TextField(const std::shared_ptr<MetaObject>& structure, const std::string& field) {
-    auto value = std::dynamic_pointer_cast<MetaString>(FieldOf(structure, field));
-    EXPECT_TRUE(value) << field << " is not a text";
-    return value ? value->GetValue() : std::string();
-}
-
-int64_t IntField(const std::shared_ptr<MetaObject>& structure, const std::string& field) {
-    auto value = std::dynamic_pointer_cast<MetaInt>(FieldOf(structure, field));
-    EXPECT_TRUE(value) << field << " is not an integer";
-    return value ? value->GetValue() : 0;
-}
-
-bool BoolField(const std::shared_ptr<MetaObject>& structure, const std::string& field) {
-    auto value = std::dynamic_pointer_cast<MetaBool>(FieldOf(structure, field));
-    EXPECT_TRUE(value) << field << " is not a boolean";
-    return value && value->GetValue();
-}
-
-std::vector<std::string> FieldNames(const std::shared_ptr<MetaObject>& structure) {
-    std::vector<std::string> names;
-    auto s = std::dynamic_pointer_cast<MetaStruct>(structure);
-    EXPECT_TRUE(s) << "not a structure";
-    if (s) {
-        for (const auto& field : s->GetFields()) names.push_back(field.name);
-    }
-    return names;
-}
-
-std::vector<std::shared_ptr<MetaObject>> ListElements(const std::shared_ptr<MetaObject>& list) {
-    auto l = std::dynamic_pointer_cast<MetaList>(list);
-    EXPECT_TRUE(l) << "not a list";
-    return l ? l->GetElements() : std::vector<std::shared_ptr<MetaObject>>();
 }
 
 }  // namespace MeskTest

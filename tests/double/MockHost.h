@@ -120,7 +120,8 @@ enum class InfoKind {
 class MockHost : public HostCtlSim::HostBackend {
   public:
     // By default GetMeskPlugin hands out a plug-in whose info objects forward to `info`, and
-    // the conversions and UUID functions behave as the real library's.
+    // the conversions and UUID functions behave as the real library's (those not mocked here
+    // are the backend's own).
     explicit MockHost(MockMeskInfo& info);
     ~MockHost() override;
 
@@ -140,9 +141,6 @@ class MockHost : public HostCtlSim::HostBackend {
                 (override));
     MOCK_METHOD(std::string, GetFormattedSystemDateTime, (), (override));
     MOCK_METHOD(Uuid, StringToMeskUuid, (const std::string&), (override));
-    MOCK_METHOD(std::string, MeskUuidToString, (const Uuid&), (override));
-    MOCK_METHOD(size_t, UTF8StringCharLength, (const std::string&), (override));
-    MOCK_METHOD(MeskPolicyClass, StringToMeskPolicyClass, (const std::string&), (override));
     MOCK_METHOD(std::string, MeskPolicyClassToString, (MeskPolicyClass), (override));
     MOCK_METHOD(std::vector<MeskPolicyClass>, GetMeskPolicyClasses, (), (override));
     MOCK_METHOD(char*, UUID_CreateRandom, (), (override));
@@ -150,16 +148,10 @@ class MockHost : public HostCtlSim::HostBackend {
 
     // The kind of info object that the default plug-in hands out.
     InfoKind infoKind = InfoKind::Extended;
-    // How many plug-in and info objects were made and released so far.
+    // How many plug-in objects were made, and info objects made and released, so far.
     int pluginsMade = 0;
-    int pluginsReleased = 0;
     int infosMade = 0;
     int infosReleased = 0;
-
-    std::unique_ptr<HostCtl::MeskPlugin> MakePlugin();
-
-  private:
-    MockMeskInfo& info_;
 };
 
 // A disk device with a fixed name and UUID.
@@ -203,11 +195,8 @@ class HostTest : public ::testing::Test {
     HostTest();
     ~HostTest() override;
 
-    // Runs the command's ExecuteInternal with that input, or with the options written as
-    // "name=value name=value" (a list option once per value, a flag as its bare name);
-    // returns the output.
-    std::shared_ptr<Kalmor::CallSpec::Output> Run(Kalmor::AutoCli::Command& command,
-                                                  std::shared_ptr<Kalmor::CallSpec::Input> input);
+    // Runs the command's ExecuteInternal with the options written as "name=value name=value"
+    // (a list option once per value, a flag as its bare name); returns the output.
     std::shared_ptr<Kalmor::CallSpec::Output> Run(Kalmor::AutoCli::Command& command,
                                                   const std::string& options = "");
 
@@ -244,29 +233,5 @@ std::string Outcome(const Kalmor::CallSpec::Output& output);
 // not a list of structures with that field.
 std::vector<std::string> Elements(const std::shared_ptr<Kalmor::MetaObj::MetaObject>& list,
                                   const std::string& field = "");
-
-// A command's input from options written as "name=value name=value"; a list option is given
-// once per value.
-std::shared_ptr<Kalmor::CallSpec::Input> InputOf(const std::string& options);
-
-// Reading a result.
-std::vector<std::string> Errors(const Kalmor::CallSpec::Output& output);
-// A refusal before the command acted: that one error message, no result, output not complete.
-void ExpectRefused(const Kalmor::CallSpec::Output& output, const std::string& message);
-// The bare boolean result; fails the test when the root is not a set MetaBool.
-bool BoolResult(const Kalmor::CallSpec::Output& output);
-// The text, integer or boolean value of a structure's field; fails the test when it is
-// missing or of another kind.
-std::string TextField(const std::shared_ptr<Kalmor::MetaObj::MetaObject>& structure,
-                      const std::string& field);
-int64_t IntField(const std::shared_ptr<Kalmor::MetaObj::MetaObject>& structure,
-                 const std::string& field);
-bool BoolField(const std::shared_ptr<Kalmor::MetaObj::MetaObject>& structure,
-               const std::string& field);
-// The field names of a structure, in order.
-std::vector<std::string> FieldNames(const std::shared_ptr<Kalmor::MetaObj::MetaObject>& structure);
-// The elements of a list root object; fails the test when the root is not a list.
-std::vector<std::shared_ptr<Kalmor::MetaObj::MetaObject>> ListElements(
-    const std::shared_ptr<Kalmor::MetaObj::MetaObject>& list);
 
 }  // namespace MeskTest
