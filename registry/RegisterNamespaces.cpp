@@ -1,10 +1,23 @@
 // The `mesk` namespace tree: every namespace and command of the plug-in, in registration order.
 //
-// Adding a command takes:
-//   1. its class, commands/<area>/<Class>.h and .cpp, shaped like its neighbours;
-//   2. one AddCommand line below, at its place in the tree;
-//   3. unit tests in tests/unit/<area>/ and an end-to-end case in tests/e2e/;
-//   4. the command reference regenerated (docs/commands.md).
+// Adding a command takes, in this order:
+//   1. its class, commands/<area>/<Class>.h and .cpp, shaped like its neighbours (the area's
+//      sources are picked up by CMake; a new area is added to MESK_COMMAND_AREAS in the root
+//      CMakeLists.txt);
+//   2. any host-control operation it needs that does not exist yet: its declaration in
+//      frame/hostctl/, the simulated host's answer in platform/hostctl/ (and docs/hostsim.md),
+//      and the test double in tests/double/MockHost.h (a line of MESK_INFO_OPERATIONS for an
+//      operation of the info object, a MOCK_METHOD of MockHost for a static one);
+//   3. its header included and one AddCommand line below, at its place in the tree;
+//   4. docs/commands.md regenerated with scripts/gen-docs (tests/e2e/test_reference.sh fails
+//      while it is stale);
+//   5. unit tests in tests/unit/<area>/<Area>Test.cpp, through the test double: the success
+//      path, each refusal and failure with its exact message, the result and completion after
+//      a failure;
+//   6. a case in tests/e2e/test_<area>.sh that runs it against the simulated host.
+// The rules every command follows (tests/unit/registry/RegistryTest.cpp), the bad-input suite
+// (tests/e2e/test_bad_input.sh) and the output formats test (tests/e2e/test_output_formats.sh)
+// walk the registered tree and need no edit.
 
 #include <memory>
 #include <stdexcept>
