@@ -7,9 +7,9 @@
 # What autocli refuses must exit 2 with one line on stderr that names the option, and must
 # not have run the command: `hostsim show` (and the tracing service's file) byte-identical,
 # no host-control call logged. What it accepts must exit 0 or 1, never die by a signal or
-# hang, with every formatter of a structured result still readable, and no shell ever runs a
-# value. A text with a line break or another control character is refused for every text
-# parameter.
+# hang, and no shell ever runs a value (that every formatter stays readable whatever the
+# values, the formatter fuzzing shows). A text with a line break or another control character
+# is refused for every text parameter.
 source "$(dirname "$0")/lib.sh"
 
 MARK="$E2E_DIR/shell-ran"
@@ -53,10 +53,9 @@ valid_text() {
 }
 
 # The commands and their parameters, from autocli's command reference (one run for all):
-# PATHS in registration order; per path STRUCTURED (1 when the result is a structure or a
-# list of them) and PARAMS (its parameter names); per "path|name" KIND (text, integer,
-# boolean, flag, list), SHORT and REQUIRED (yes/no).
-declare -A STRUCTURED PARAMS KIND SHORT REQUIRED
+# PATHS in registration order; per path PARAMS (its parameter names); per "path|name" KIND
+# (text, integer, boolean, flag, list), SHORT and REQUIRED (yes/no).
+declare -A PARAMS KIND SHORT REQUIRED
 read_reference() {
     PATHS=()
     local line path="" row='^\| `--([a-z0-9-]+)` \| (`-([[:alnum:]])`)? *\| ([a-z, ]+) \| (yes|no) \|'
@@ -66,9 +65,6 @@ read_reference() {
         elif [[ "$line" =~ ^Type:\  ]]; then
             PATHS+=("$path")
             PARAMS[$path]=""
-            STRUCTURED[$path]=0
-        elif [[ "$line" =~ ^Output:.*structure ]]; then
-            STRUCTURED[$path]=1
         elif [[ "$line" =~ $row ]]; then
             local key="$path|${BASH_REMATCH[1]}"
             PARAMS[$path]+=" ${BASH_REMATCH[1]}"
@@ -132,20 +128,6 @@ base_without() {
     done
 }
 
-# Every formatter of a structured result is readable.
-check_formatters() {
-    local format
-    for format in json xml csv; do
-        _capture timeout 20 "$AUTOCLI" "--formatter=$format" "$@"
-        if [ "$RC" -gt 1 ]; then _fail "--formatter=$format exited $RC"; continue; fi
-        case "$format" in
-            json) if [ -n "$OUT" ] && ! jq -e . >/dev/null 2>&1 <<<"$OUT"; then _fail "json does not parse"; else _pass; fi ;;
-            xml) if [ -n "$OUT" ] && ! xmllint --noout - 2>/dev/null <<<"$OUT"; then _fail "xml is not well-formed"; else _pass; fi ;;
-            csv) _pass ;;
-        esac
-    done
-}
-
 # A refused command leaves the host as it was and calls nothing, so the host is compared with
 # its snapshot and the call log read once for a run of refused cases (before a case that may
 # run its command, and after each parameter) rather than after each one.
@@ -182,7 +164,6 @@ try() {
     case "$RC" in
         0 | 1)
             if [ "$expect" = refused ]; then _fail "accepted, expected exit 2"; else _pass; fi
-            if [ "$IS_STRUCTURED" = 1 ]; then check_formatters "$@"; fi
             populate
             ;;
         2)
@@ -220,12 +201,9 @@ for path in "${LISTED[@]}"; do
     case_ "$path"
     read_parameters
     PARAMETERS=$((PARAMETERS + ${#NAMES[@]}))
-    IS_STRUCTURED="${STRUCTURED[$path]:-0}"
 
-    # The command as a whole: its required options with valid values (and every formatter),
-    # an unknown option, each required option left out.
+    # The command as a whole: an unknown option, each required option left out.
     base_without ""
-    if [ "$IS_STRUCTURED" = 1 ]; then check_formatters "${COMMAND[@]}" "${BASE[@]}"; populate; fi
     try refused --no-such-option "${COMMAND[@]}" "${BASE[@]}" --no-such-option x
     for name in "${NAMES[@]}"; do
         if [ "${P_REQUIRED[$name]}" = 1 ]; then
@@ -324,15 +302,7 @@ run mesk cluster leave
 expect_rc 0
 sim calls
 expect_out_has "$(printf "$NOTIFY" PreUnmount)"
-populate
-sim fail LeaveCluster "refused"
-run mesk cluster leave
-expect_rc 1
-sim calls
-expect_out_has "$(printf "$NOTIFY" PreUnmount)"
-expect_out_has "$(printf "$NOTIFY" FailedUnmount)"
 if [ -e "$MARK" ]; then _fail "a shell ran part of the datastore name"; else _pass; fi
-"$HOSTSIM" fail --clear
 
 echo "$CASES cases over ${#LISTED[@]} commands and $PARAMETERS parameters"
 finish
