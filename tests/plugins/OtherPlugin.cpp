@@ -43,45 +43,29 @@ class OtherHello : public virtual Command {
 
     std::shared_ptr<InputSpec> GetInputSpecInternal() override {
         auto spec = InputSpec::New();
-
-        auto name = ParameterSpec::New("name", Kalmor::CallSpec::PARAM_STRING);
-        name->SetShortName("n");
-        name->SetRequired(true);
-        name->SetDescription("Who to greet.");
-        spec->AddParameter(name);
-
-        auto count = ParameterSpec::New("count", Kalmor::CallSpec::PARAM_INT);
-        count->SetShortName("c");
-        count->SetDescription("How many times to greet (%ENUM%).");
+        auto add = [&spec](const char* name, Kalmor::CallSpec::ParameterType type,
+                           const char* shortName, const char* description) {
+            auto parameter = ParameterSpec::New(name, type);
+            parameter->SetShortName(shortName);
+            parameter->SetDescription(description);
+            spec->AddParameter(parameter);
+            return parameter;
+        };
+        add("name", Kalmor::CallSpec::PARAM_STRING, "n", "Who to greet.")->SetRequired(true);
         auto range = ParameterConstraint::New(Kalmor::CallSpec::CONSTRAINT_INT_RANGE);
         range->SetIntRange(0, 512);
-        count->SetConstraint(range);
-        spec->AddParameter(count);
-
-        auto loud = ParameterSpec::New("loud", Kalmor::CallSpec::PARAM_BOOL);
-        loud->SetShortName("l");
-        loud->SetDescription("Shout the greeting.");
-        spec->AddParameter(loud);
-
-        auto wave = ParameterSpec::New("wave", Kalmor::CallSpec::PARAM_FLAG);
-        wave->SetShortName("w");
-        wave->SetDescription("Wave as well.");
-        spec->AddParameter(wave);
-
-        auto item = ParameterSpec::New("item", Kalmor::CallSpec::PARAM_STRING_LIST);
-        item->SetShortName("i");
-        item->SetDescription("An item to hand over; repeat for several.");
-        spec->AddParameter(item);
-
-        auto role = ParameterSpec::New("role", Kalmor::CallSpec::PARAM_STRING);
-        role->SetShortName("r");
-        role->SetDescription("Role of the greeted node (One of %ENUM%, default is witness).");
+        add("count", Kalmor::CallSpec::PARAM_INT, "c", "How many times to greet (%ENUM%).")
+            ->SetConstraint(range);
+        add("loud", Kalmor::CallSpec::PARAM_BOOL, "l", "Shout the greeting.");
+        add("wave", Kalmor::CallSpec::PARAM_FLAG, "w", "Wave as well.");
+        add("item", Kalmor::CallSpec::PARAM_STRING_LIST, "i",
+            "An item to hand over; repeat for several.");
         auto roles = ParameterConstraint::New(Kalmor::CallSpec::CONSTRAINT_STRING_ENUM);
         roles->AddStringEnum("witness", "");
         roles->AddStringEnum("node", "");
-        role->SetConstraint(roles);
-        spec->AddParameter(role);
-
+        add("role", Kalmor::CallSpec::PARAM_STRING, "r",
+            "Role of the greeted node (One of %ENUM%, default is witness).")
+            ->SetConstraint(roles);
         return spec;
     }
 
@@ -103,25 +87,15 @@ class OtherHello : public virtual Command {
 
     void ExecuteInternal(std::shared_ptr<Input> input, std::shared_ptr<Output> output) override {
         const std::string name = input->GetParameter("name");
-        if (name == "throw") {
-            throw std::runtime_error("hello refused to greet 'throw'");
-        }
+        if (name == "throw") throw std::runtime_error("hello refused to greet 'throw'");
         std::string greeting = "Hello, " + name;
-        if (input->GetParameterBool("loud")) {
-            greeting += "!";
-        }
-        if (input->IsFlagSet("wave")) {
-            greeting += " (waving)";
-        }
-        if (input->HasParameter("role")) {
-            greeting += " the " + input->GetParameter("role");
-        }
+        if (input->GetParameterBool("loud")) greeting += "!";
+        if (input->IsFlagSet("wave")) greeting += " (waving)";
+        if (input->HasParameter("role")) greeting += " the " + input->GetParameter("role");
         std::vector<std::string> values;
         input->GetParameterList("item", values);
         auto items = MetaList::New(Kalmor::MetaObj::META_STRING);
-        for (const auto& value : values) {
-            items->Add(value);
-        }
+        for (const auto& value : values) items->Add(value);
 
         auto result = GetOutputStructure();
         result->SetField("Greeting", MetaString::New(greeting), MetaStruct::_docEmpty);
