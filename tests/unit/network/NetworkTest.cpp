@@ -149,36 +149,30 @@ TEST_F(NetworkTest, CommandsNeedingMeskInfo2RefuseAPlainOrMissingInfoObject) {
 }
 
 // Every field of each record in the library's order; 32-bit values are widened with their
-// sign; "IP Protocol" is "IP" whatever the groups are. A record's accessors cannot fail, so
-// the library can fail only before the first entry: the empty list is then still the result,
-// complete, beside the bare message.
+// sign; "IP Protocol" is "IP" whatever the groups are, here IPv6 in every slot. A record's
+// accessors cannot fail, so the library can fail only before the first entry: the empty list is
+// then still the result, complete, beside the bare message.
 TEST_F(NetworkTest, ListShowsEveryRecordFieldByField) {
     EXPECT_CALL(info, GetZuvNicConfigs())
         .WillOnce([] {
             NicList list;
-            list.push_back(Nic("zuvnic2", true, true));
-            list.back()->SetIfaceUuid("5e1c0d3a-0000-0000-0000-000000000002");
             list.push_back(std::make_unique<MeskZuvNicConfig2>(
                 "zuvnic0", MeskIpAddress(Ipv6Address("ff05::1")),
                 MeskIpAddress(Ipv6Address("ff05::2")), MeskIpAddress(Ipv6Address("ff05::3")),
-                MeskIpAddress(Ipv6Address("ff05::4")), -1, -2147483647 - 1, 0, -5, false, false,
-                ""));
+                MeskIpAddress(Ipv6Address("ff05::4")), -1, -2147483647 - 1, 0, -5, true, true, ""));
+            list.back()->SetIfaceUuid("5e1c0d3a-0000-0000-0000-000000000002");
             return list;
         })
         .WillOnce(Fail("locked"));
     EXPECT_EQ(
         Outcome(*Run(*NetworkList::New())),
-        "[{ZuvNic Name=zuvnic2, IP Protocol=IP, Interface "
-        "UUID=5e1c0d3a-0000-0000-0000-000000000002, "
-        "Agent Group Multicast Address=239.1.1.1, Agent Group IPv6 Multicast Address=ff05::1, "
-        "Agent Group Multicast Port=1000, Master Group Multicast Address=239.2.2.2, "
-        "Master Group IPv6 Multicast Address=ff05::2, Master Group Multicast Port=2000, "
-        "Host Unicast Channel Bound Port=3000, Multicast TTL=9, Traffic Type=mesk, witness}, "
-        "{ZuvNic Name=zuvnic0, IP Protocol=IP, Interface UUID=, "
+        "[{ZuvNic Name=zuvnic0, IP Protocol=IP, "
+        "Interface UUID=5e1c0d3a-0000-0000-0000-000000000002, "
         "Agent Group Multicast Address=ff05::1, Agent Group IPv6 Multicast Address=ff05::2, "
         "Agent Group Multicast Port=-1, Master Group Multicast Address=ff05::3, "
         "Master Group IPv6 Multicast Address=ff05::4, Master Group Multicast Port=-2147483648, "
-        "Host Unicast Channel Bound Port=0, Multicast TTL=-5, Traffic Type=}], complete");
+        "Host Unicast Channel Bound Port=0, Multicast TTL=-5, Traffic Type=mesk, witness}], "
+        "complete");
     EXPECT_EQ(Outcome(*Run(*NetworkList::New())), "locked; [], complete");
 }
 
