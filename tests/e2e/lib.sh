@@ -2,6 +2,7 @@
 # simulated host of its own in a temporary directory, reset to the default host.
 #
 #   run ARGS...        runs autocli; sets OUT, ERR and RC
+#   ok ARGS...         runs autocli and expects exit status 0
 #   sim ARGS...        runs hostsim; sets OUT, ERR and RC
 #   expect_rc N        the last run exited with N
 #   expect_out TEXT    stdout is exactly TEXT (a trailing newline is ignored)
@@ -37,6 +38,10 @@ _capture() {
 }
 
 run() { _capture "$AUTOCLI" "$@"; }
+ok() {
+    run "$@"
+    expect_rc 0
+}
 sim() { _capture "$HOSTSIM" "$@"; }
 
 # Names the case that the following expectations belong to.

@@ -15,11 +15,9 @@ expect_out_has "Cluster Information
    Current Local Time:"
 
 case_ "new makes a cluster that get shows enabled with its UUID"
-run mesk cluster new
-expect_rc 0
+ok mesk cluster new
 expect_out ""
-run mesk cluster get
-expect_rc 0
+ok mesk cluster get
 expect_out_has "   Enabled: true"
 expect_out_has "   Local Node Type: NORMAL"
 CLUSTER_UUID=$(printf '%s\n' "$OUT" | sed -n 's/^ *Sub-Cluster UUID: //p')
@@ -29,29 +27,24 @@ expect_eq "$(jq -r .cluster.uuid <<<"$OUT")" "$CLUSTER_UUID" "cluster UUID on th
     _fail "no cluster UUID: '$CLUSTER_UUID'"
 
 case_ "leave, then get shows clustering disabled"
-run mesk cluster leave
-expect_rc 0
+ok mesk cluster leave
 expect_out ""
 run mesk cluster get
 expect_rc 1
 expect_err "Mesk Clustering is not enabled on this host"
 
 case_ "a witness joins, then reads and changes the preferred fault domain"
-run mesk cluster join -u "$JOIN_UUID" --witness-node --witness-preferred-fault-domain "Site A"
-expect_rc 0
-run mesk cluster get
+ok mesk cluster join -u "$JOIN_UUID" --witness-node --witness-preferred-fault-domain "Site A"
+ok mesk cluster get
 expect_out_has "   Local Node Type: WITNESS"
 expect_out_has "   Sub-Cluster UUID: $JOIN_UUID"
-run mesk cluster preferredfaultdomain set -n "Site B"
-expect_rc 0
-run mesk cluster preferredfaultdomain get
-expect_rc 0
+ok mesk cluster preferredfaultdomain set -n "Site B"
+ok mesk cluster preferredfaultdomain get
 expect_out_has "Preferred Fault Domain Name: Site B
 Preferred Fault Domain Id: "
 
 case_ "restore passes the boot flag on"
-run mesk cluster restore --boot
-expect_rc 0
+ok mesk cluster restore --boot
 sim calls
 expect_out_has '{"op":"RestoreClusterConfig","args":[true]'
 

@@ -10,8 +10,7 @@ case_ "__complete over both plug-ins: namespaces, commands, values"
 while IFS='|' read -r expected words; do
     # shellcheck disable=SC2086
     eval "set -- $words"
-    run __complete "$@"
-    expect_rc 0
+    ok __complete "$@"
     expect_err ""
     expect_eq "$(printf '%s' "$OUT" | tr '\n' ' ')" "$expected" "__complete $words"
 done <<'CASES'
@@ -31,8 +30,7 @@ expect_out "storage
 expect_err ""
 
 case_ "the bash adaptor fills COMPREPLY from autocli"
-run completion bash
-expect_rc 0
+ok completion bash
 SCRIPT="$E2E_DIR/autocli.bash"
 printf '%s\n' "$OUT" >"$SCRIPT"
 # shellcheck disable=SC2016

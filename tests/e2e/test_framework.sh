@@ -13,12 +13,10 @@ PLUGINS="${MESK_TEST_PLUGIN_DIR:-$(dirname "$AUTOCLI")/../../test-plugins}"
 export AUTOCLI_PLUGIN_PATH="$PLUGINS"
 
 case_ "help of the root, a namespace and a command"
-run --help
-expect_rc 0
+ok --help
 expect_out_has "mesk  Other mesk"
 expect_out_has "--formatter NAME"
-run mesk other hello -h
-expect_rc 0
+ok mesk other hello -h
 expect_out_has "  -c, --count <integer>  How many times to greet (0-512)."
 
 case_ "a path that stops at a namespace prints its help and fails"
@@ -28,8 +26,7 @@ expect_out_has "hello  Greet someone from the second plug-in."
 expect_err "autocli: mesk other: missing command; valid choices: hello"
 
 case_ "simple output: title from a field, display order, units, joined lists"
-run mesk other hello -n bob -c 3 -i apple -i pear --loud true -w --role node
-expect_rc 0
+ok mesk other hello -n bob -c 3 -i apple -i pear --loud true -w --role node
 expect_out "Hello, bob! (waving) the node
    Greeting: Hello, bob! (waving) the node
    Items: apple, pear

@@ -18,51 +18,42 @@ interfaces() {
 }
 
 case_ "add without options writes the defaults; set of one port keeps the rest and the UUID"
-run mesk network list --formatter=json
+ok mesk network list --formatter=json
 expect_out '[]'
-run mesk network ip add -i zuvnic1
-expect_rc 0
+ok mesk network ip add -i zuvnic1
 expect_out ''
-run mesk network list --formatter=json
+ok mesk network list --formatter=json
 expect_out_has '[{"ZuvNic Name":"zuvnic1","IP Protocol":"IP","Interface UUID":"'
 # shellcheck disable=SC2086
 expect_out_has "$(entry_tail $DEFAULT_GROUPS 12321 5 mesk)"
 before=$(interfaces)
-run mesk network ip set -i zuvnic1 -p 2000 -T witness -T mesk
-expect_rc 0
-run mesk network list --formatter=json
+ok mesk network ip set -i zuvnic1 -p 2000 -T witness -T mesk
+ok mesk network list --formatter=json
 expect_out_has "$(entry_tail 224.2.3.4 FF19:0:0:0:0:2:3:4 2000 224.1.2.3 FF19:0:0:0:0:1:2:3 12345 12321 5 "mesk, witness")"
 expect_eq "$(interfaces)" "$before" "interface UUID after set"
 
 case_ "clear empties the configuration and restore brings it back"
-run mesk network ip add -i zuvnic2 -u 239.1.1.1
+ok mesk network ip add -i zuvnic2 -u 239.1.1.1
 before=$(interfaces)
-run mesk network clear
-expect_rc 0
+ok mesk network clear
 expect_out ''
 expect_eq "$(interfaces)" "" "interfaces after clear"
-run mesk network restore
-expect_rc 0
+ok mesk network restore
 expect_eq "$(interfaces)" "$before" "interfaces after restore"
 
 case_ "remove takes both traffic types; an ordinary interface needs no --force"
-run mesk network ip remove -i zuvnic1
-expect_rc 0
+ok mesk network ip remove -i zuvnic1
 expect_out ''
-run mesk network remove -i zuvnic2
-expect_rc 0
+ok mesk network remove -i zuvnic2
 expect_eq "$(interfaces)" "" "interfaces after removal"
 
 case_ "the ipv4 alias adds, sets and removes alike"
-run mesk network ipv4 add -i zuvnic3 -t 16
-expect_rc 0
-run mesk network ipv4 set -i zuvnic3 -c 4000
-expect_rc 0
-run mesk network list --formatter=json
+ok mesk network ipv4 add -i zuvnic3 -t 16
+ok mesk network ipv4 set -i zuvnic3 -c 4000
+ok mesk network list --formatter=json
 # shellcheck disable=SC2086
 expect_out_has "$(entry_tail $DEFAULT_GROUPS 4000 16 mesk)"
-run mesk network ipv4 remove -i zuvnic3 --force
-expect_rc 0
+ok mesk network ipv4 remove -i zuvnic3 --force
 expect_eq "$(interfaces)" "" "interfaces after removal"
 
 finish

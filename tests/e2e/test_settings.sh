@@ -6,72 +6,59 @@ source "$(dirname "${BASH_SOURCE[0]}")/lib.sh"
 POLICY='(("hostFailuresToTolerate" i1) ("stripeWidth" i2))'
 
 case_ "rename the datastore and read the new name back"
-run mesk datastore name get
-expect_rc 0
+ok mesk datastore name get
 expect_out "Name: meskDatastore"
-run mesk datastore name set --newname "site A store"
-expect_rc 0
+ok mesk datastore name set --newname "site A store"
 expect_out ""
-run mesk datastore name get
+ok mesk datastore name get
 expect_out "Name: site A store"
 
 case_ "set a fault domain; its id shows only once the host is in a cluster"
-run mesk faultdomain set -n rack-1
-expect_rc 0
+ok mesk faultdomain set -n rack-1
 expect_out ""
-run mesk faultdomain get
-expect_rc 0
+ok mesk faultdomain get
 expect_out $'faultDomainName: rack-1\nfaultDomainId:'
-run mesk cluster new
-run mesk faultdomain get
+ok mesk cluster new
+ok mesk faultdomain get
 expect_out_has "faultDomainName: rack-1"
 FD_ID=$(printf '%s\n' "$OUT" | sed -n 's/^faultDomainId: //p')
 [[ "$FD_ID" =~ ^[0-9a-f]{8}(-[0-9a-f]{4}){3}-[0-9a-f]{12}$ ]] && _pass || _fail "no id: '$FD_ID'"
 
 case_ "reset goes back to no fault domain"
-run mesk faultdomain reset
-expect_rc 0
-run mesk faultdomain get
+ok mesk faultdomain reset
+ok mesk faultdomain get
 expect_out_has $'faultDomainName:\n'
 
 case_ "cancel ends the maintenance operation in progress"
 sim load --merge - <<<'{"settings": {"maintenanceOperation": "ensureAccessibility"}}'
-run mesk maintenancemode cancel
-expect_rc 0
+ok mesk maintenancemode cancel
 expect_out ""
 expect_eq "$("$HOSTSIM" show | jq -r .settings.maintenanceOperation)" "" "operation after cancel"
 
 case_ "set default policies, list them as a table, and clear them"
-run mesk policy setdefault -c vdisk -p "$POLICY"
-expect_rc 0
+ok mesk policy setdefault -c vdisk -p "$POLICY"
 expect_out ""
-run mesk policy setdefault --policy-class vmswap --policy '(("proportionalCapacity" i100))'
-expect_rc 0
-run mesk policy getdefault
-expect_rc 0
+ok mesk policy setdefault --policy-class vmswap --policy '(("proportionalCapacity" i100))'
+ok mesk policy getdefault
 expect_eq "$(grep -E '^(cluster|vdisk|vmnamespace|vmswap|vmem)( |$)' <<<"$OUT")" "cluster
 vdisk         $POLICY
 vmnamespace
 vmswap        ((\"proportionalCapacity\" i100))
 vmem" "rows of the table"
-run mesk policy cleardefault
-expect_rc 0
+ok mesk policy cleardefault
 expect_out ""
-run mesk policy getdefault --formatter=json
+ok mesk policy getdefault --formatter=json
 expect_out_lacks "stripeWidth"
 expect_out_lacks "proportionalCapacity"
 
 case_ "set the resync throttle (output never complete), read it and the bandwidth with their unit"
-run mesk resync throttle set --level 120 --debug
-expect_rc 0
+ok mesk resync throttle set --level 120 --debug
 expect_out ""
 expect_err "output complete: no"
-run mesk resync throttle get
-expect_rc 0
+ok mesk resync throttle get
 expect_out "Level: 120 Mbps"
 sim load --merge - <<<'{"resync": {"bandwidth": 250}}'
-run mesk resync bandwidth get
-expect_rc 0
+ok mesk resync bandwidth get
 expect_out "Rate: 250 Mbps"
 
 finish

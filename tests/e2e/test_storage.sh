@@ -16,34 +16,29 @@ HDD2_UUID=52a0e7c4-1b2d-4e3f-8a90-0b1c2d3e4f03
 host_disks() { "$HOSTSIM" show | jq -c "[.storage.disks[].$1]"; }
 
 case_ "a fresh host lists its four devices, none in use"
-run --formatter=json mesk storage list
-expect_rc 0
+ok --formatter=json mesk storage list
 expect_eq "$(jq -c '[.[] | [.Device, ."Used by this host"]]' <<<"$OUT")" \
     "[[\"$SSD\",false],[\"$HDD1\",false],[\"$HDD2\",false],[\"$HDD3\",false]]" "devices"
 
 case_ "the capacity-flash tag goes on an unclaimed SSD and comes off again"
-run mesk storage tag add -t capacityFlash -d "$SSD"
-expect_rc 0
+ok mesk storage tag add -t capacityFlash -d "$SSD"
 expect_eq "$(host_disks capacityFlashTag)" "[true,false,false,false]" "tags after add"
-run mesk storage tag remove -t capacityFlash -d "$SSD"
-expect_rc 0
+ok mesk storage tag remove -t capacityFlash -d "$SSD"
 expect_eq "$(host_disks capacityFlashTag)" "[false,false,false,false]" "tags after remove"
 
 case_ "add claims the SSD and two HDDs into one disk group, which list shows"
-run mesk storage add -s "$SSD" -d "$HDD1" -d "$HDD2"
-expect_rc 0
+ok mesk storage add -s "$SSD" -d "$HDD1" -d "$HDD2"
 expect_out ""
 expect_eq "$(host_disks diskGroupUuid)" "[\"$SSD_UUID\",\"$SSD_UUID\",\"$SSD_UUID\",\"\"]" "groups"
-run --formatter=json mesk storage list -d "$HDD2"
+ok --formatter=json mesk storage list -d "$HDD2"
 expect_eq "$(jq -c '[.[] | [.Device, ."MESK Disk Group UUID", ."Used by this host"]]' <<<"$OUT")" \
     "[[\"$HDD2\",\"$SSD_UUID\",true]]" "HDD2 listed by name"
-run --formatter=json mesk storage list -u "$HDD1_UUID"
+ok --formatter=json mesk storage list -u "$HDD1_UUID"
 expect_eq "$(jq -c '[.[].Device]' <<<"$OUT")" "[\"$HDD1\"]" "HDD1 listed by UUID"
 
 case_ "unmount and mount by group, disk and UUID"
 while IFS='|' read -r command mounted; do
-    run mesk storage diskgroup $command
-    expect_rc 0
+    ok mesk storage diskgroup $command
     expect_eq "$(host_disks mounted)" "$mounted" "mounted after $command"
 done <<TABLE
 unmount -s $SSD|[false,false,false,false]
@@ -55,8 +50,7 @@ TABLE
 
 case_ "remove by name, by UUID and the whole group, with each evacuation mode"
 while IFS='|' read -r command groups; do
-    run mesk storage $command
-    expect_rc 0
+    ok mesk storage $command
     expect_out ""
     expect_eq "$(host_disks diskGroupUuid)" "$groups" "groups after $command"
 done <<TABLE
@@ -70,12 +64,10 @@ TABLE
 expect_eq "$(host_disks usedByThisHost)" "[true,false,false,false]" "disks in use"
 
 case_ "auto-claim mode: get, set, and get again"
-run mesk storage automode get
-expect_rc 0
+ok mesk storage automode get
 expect_out "Enabled: false"
-run mesk storage automode set --enabled true
-expect_rc 0
-run --formatter=json mesk storage automode get
+ok mesk storage automode set --enabled true
+ok --formatter=json mesk storage automode get
 expect_out '{"Enabled":true}'
 expect_eq "$("$HOSTSIM" show | jq .storage.autoClaimMode)" true "auto-claim mode on the host"
 

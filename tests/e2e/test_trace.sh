@@ -6,8 +6,7 @@ source "$(dirname "${BASH_SOURCE[0]}")/lib.sh"
 CONF="$MESK_HOST_ROOT/etc/orvane/mesk/mesktraced.conf"
 
 case_ "get reports the settings of the host's file"
-run mesk trace get
-expect_rc 0
+ok mesk trace get
 expect_err ""
 expect_out "MESK Traces Directory: /scratch/mesktrace
 Number Of Files To Rotate: 8
@@ -15,8 +14,7 @@ Maximum Trace File Size: 45 MB
 Log Urgent Traces To Syslog: true"
 
 case_ "set rewrites the file and restarts the service; get reads the service's own key"
-run mesk trace set -p /vol/traces -f 3 -s 100 -l false --debug
-expect_rc 0
+ok mesk trace set -p /vol/traces -f 3 -s 100 -l false --debug
 expect_out ""
 expect_err_has "output complete: yes"
 expect_eq "$(tail -n +2 "$CONF")" 'MESKTRACED_LAST_SELECTED_VOLUME="/scratch/mesktrace"
@@ -26,7 +24,7 @@ MESKTRACED_LOG_URGENT_TO_SYSLOG=0
 MESKTRACED_ROTATE_FILE_SIZE=100' "rewritten file"
 sim calls
 expect_out_has '{"op":"/etc/init.d/mesktraced","args":["restart"],"exit":0}'
-run mesk trace get
+ok mesk trace get
 expect_out "MESK Traces Directory: /scratch/mesktrace
 Number Of Files To Rotate: 3
 Maximum Trace File Size: 100 MB
@@ -34,10 +32,9 @@ Log Urgent Traces To Syslog: false"
 
 case_ "reset keeps only the comments, so get shows the defaults"
 COMMENT=$(head -n 1 "$CONF")
-run mesk trace set --reset true
-expect_rc 0
+ok mesk trace set --reset true
 expect_eq "$(cat "$CONF")" "$COMMENT" "file after reset"
-run mesk trace get
+ok mesk trace get
 expect_out "MESK Traces Directory: No volume selected.
 Number Of Files To Rotate: 8
 Maximum Trace File Size: 45 MB

@@ -8,16 +8,13 @@ ZERO=00000000-0000-0000-0000-000000000000
 host_agents() { "$HOSTSIM" show | jq -c .unicastAgents; }
 
 case_ "a node and a witness are added and listed"
-run mesk cluster new
-run mesk cluster unicastagent add -t node -u $NODE -U true -a 10.0.0.1 -i zuvnic1
-expect_rc 0
+ok mesk cluster new
+ok mesk cluster unicastagent add -t node -u $NODE -U true -a 10.0.0.1 -i zuvnic1
 expect_out ""
-run mesk cluster unicastagent add -a fe80::9 -p 4000
-expect_rc 0
+ok mesk cluster unicastagent add -a fe80::9 -p 4000
 expect_eq "$(host_agents)" "[\"$NODE;0;1;10.0.0.1;12321;zuvnic1\",\"$ZERO;1;0;fe80::9;4000;\"]" \
     "agents on the host"
-run mesk cluster unicastagent list
-expect_rc 0
+ok mesk cluster unicastagent list
 expect_out "Unicast Agent
 NodeUuid                              IsWitness  Supports Unicast  IP Address  Port   Iface Name
 ------------------------------------  ---------  ----------------  ----------  -----  ----------
@@ -25,11 +22,9 @@ $NODE  0          true              10.0.0.1    12321  zuvnic1
 $ZERO  1          false             fe80::9     4000"
 
 case_ "the node is removed; clear removes the rest and never completes its output"
-run mesk cluster unicastagent remove -u $NODE -a 10.0.0.1
-expect_rc 0
+ok mesk cluster unicastagent remove -u $NODE -a 10.0.0.1
 expect_eq "$(host_agents)" "[\"$ZERO;1;0;fe80::9;4000;\"]" "agents after removal"
-run --debug mesk cluster unicastagent clear
-expect_rc 0
+ok --debug mesk cluster unicastagent clear
 expect_err "output complete: no"
 expect_eq "$(host_agents)" "[]" "agents after clear"
 
