@@ -27,6 +27,10 @@ using ClusterTest = HostTest;
 
 const char kUuid[] = "52a1c3e4-1b2c-4d3e-8f90-a1b2c3d4e5f6";
 const std::string kNone = "; no result, incomplete";
+const std::string kInCluster =
+    "The host is in a Mesk cluster and enabled for Mesk. You need to remove it from the cluster "
+    "or disable Mesk." +
+    kNone;
 
 std::string Repeat(const std::string& piece, size_t count) {
     std::string text;
@@ -143,10 +147,7 @@ TEST_F(ClusterTest, JoinChecksTheWitnessOptionsThenJoins) {
               "bad uuid; false, complete");
     // An enabled host is refused before its options are looked at.
     SetEnabled(true);
-    EXPECT_EQ(Outcome(*Run(*ClusterJoin::New(), "cluster-uuid=x witness-node")),
-              "The host is in a Mesk cluster and enabled for Mesk. You need to remove it from the "
-              "cluster or disable Mesk." +
-                  kNone);
+    EXPECT_EQ(Outcome(*Run(*ClusterJoin::New(), "cluster-uuid=x witness-node")), kInCluster);
 }
 
 // The cluster is named by the random UUID packed in place; a failed creation says what it was
@@ -172,10 +173,7 @@ TEST_F(ClusterTest, NewCreatesTheClusterNamedByThePackedUuid) {
     EXPECT_CALL(host, UUID_CreateRandom()).WillOnce(Return(nullptr));
     EXPECT_EQ(Outcome(*Run(*ClusterNew::New())), "Unable to generate a UUID" + kNone);
     SetEnabled(true);
-    EXPECT_EQ(Outcome(*Run(*ClusterNew::New())),
-              "The host is in a Mesk cluster and enabled for Mesk. You need to remove it from the "
-              "cluster or disable Mesk." +
-                  kNone);
+    EXPECT_EQ(Outcome(*Run(*ClusterNew::New())), kInCluster);
     EXPECT_EQ(calls, "");
 }
 
