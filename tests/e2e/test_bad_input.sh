@@ -78,21 +78,18 @@ read_reference() {
     done < <("$AUTOCLI" --reference)
 }
 
-# The parameters of the command in COMMAND: NAMES, and per name KIND, SHORT, REQUIRED (0/1),
-# CHOICES (its enumeration, ", "-separated) and RANGE ("low high"). autocli names the allowed
-# values when it refuses one outside them; a trailing unknown option keeps the command from
-# running when the value is accepted.
-declare -A P_KIND P_SHORT P_REQUIRED CHOICES RANGE
+# The parameters of the command in COMMAND: NAMES, P (the key prefix of its parameters in
+# KIND, SHORT and REQUIRED), and per name CHOICES (its enumeration, ", "-separated) and RANGE
+# ("low high"). autocli names the allowed values when it refuses one outside them; a trailing
+# unknown option keeps the command from running when the value is accepted.
+declare -A CHOICES RANGE
 read_parameters() {
-    local path="${COMMAND[*]}" name err
-    read -r -a NAMES <<<"${PARAMS[$path]}"
-    P_KIND=() P_SHORT=() P_REQUIRED=() CHOICES=() RANGE=()
+    local name err
+    P="${COMMAND[*]}|"
+    read -r -a NAMES <<<"${PARAMS[${COMMAND[*]}]}"
+    CHOICES=() RANGE=()
     for name in "${NAMES[@]}"; do
-        P_KIND[$name]="${KIND[$path|$name]}"
-        P_SHORT[$name]="${SHORT[$path|$name]}"
-        P_REQUIRED[$name]=0
-        if [ "${REQUIRED[$path|$name]}" = yes ]; then P_REQUIRED[$name]=1; fi
-        case "${P_KIND[$name]}" in
+        case "${KIND[$P$name]}" in
             text | list) err=$("$AUTOCLI" "${COMMAND[@]}" "--$name" "not-a-choice" --zz-stop 2>&1 >/dev/null) ;;
             integer) err=$("$AUTOCLI" "${COMMAND[@]}" "--$name" 9223372036854775807 --zz-stop 2>&1 >/dev/null) ;;
             *) continue ;;
@@ -110,7 +107,7 @@ valid_value() {
     local name="$1"
     if [ -n "${CHOICES[$name]:-}" ]; then echo "${CHOICES[$name]%%, *}"; return; fi
     if [ -n "${RANGE[$name]:-}" ]; then echo "${RANGE[$name]%% *}"; return; fi
-    case "${P_KIND[$name]}" in
+    case "${KIND[$P$name]}" in
         integer) echo 1 ;;
         boolean) echo true ;;
         *) valid_text "$name" ;;
@@ -123,8 +120,8 @@ base_without() {
     BASE=()
     local name
     for name in "${NAMES[@]}"; do
-        [ "${P_REQUIRED[$name]}" = 1 ] && [ "$name" != "${1:-}" ] || continue
-        if [ "${P_KIND[$name]}" = flag ]; then BASE+=("--$name"); else BASE+=("--$name" "$(valid_value "$name")"); fi
+        [ "${REQUIRED[$P$name]}" = yes ] && [ "$name" != "${1:-}" ] || continue
+        if [ "${KIND[$P$name]}" = flag ]; then BASE+=("--$name"); else BASE+=("--$name" "$(valid_value "$name")"); fi
     done
 }
 
@@ -206,7 +203,7 @@ for path in "${LISTED[@]}"; do
     base_without ""
     try refused --no-such-option "${COMMAND[@]}" "${BASE[@]}" --no-such-option x
     for name in "${NAMES[@]}"; do
-        if [ "${P_REQUIRED[$name]}" = 1 ]; then
+        if [ "${REQUIRED[$P$name]}" = yes ]; then
             base_without "$name"
             try refused "--$name" "${COMMAND[@]}" "${BASE[@]}"
         fi
@@ -221,24 +218,24 @@ for path in "${LISTED[@]}"; do
         args=("${COMMAND[@]}" "${BASE[@]}")
         value=$(valid_value "$name")
         short_opt=""
-        if [ -n "${P_SHORT[$name]}" ]; then short_opt="-${P_SHORT[$name]}"; fi
+        if [ -n "${SHORT[$P$name]}" ]; then short_opt="-${SHORT[$P$name]}"; fi
 
         # Refused values first, so that the host is checked once for all of them before a
         # value that runs the command. Given twice (only a list takes that); no value at the
         # end of the line.
-        if [ "${P_KIND[$name]}" = flag ]; then
+        if [ "${KIND[$P$name]}" = flag ]; then
             try refused "$opt" "${args[@]}" "$opt" "$opt"
             try refused "$opt" "${args[@]}" "$opt=1"
             continue
         fi
-        if [ "${P_KIND[$name]}" != list ]; then
+        if [ "${KIND[$P$name]}" != list ]; then
             try refused "$opt" "${args[@]}" "$opt" "$value" "$opt" "$value"
         fi
         try refused "$opt" "${args[@]}" "$opt"
 
         # The values below use each spelling of an option in turn ("--name value",
         # "--name=value", "-x value" where there is a short name).
-        case "${P_KIND[$name]}" in
+        case "${KIND[$P$name]}" in
             integer)
                 try refused "$opt" "${args[@]}" "${short_opt:-$opt}" "twelve"
                 try refused "$opt" "${args[@]}" "$opt" ""
@@ -267,7 +264,7 @@ for path in "${LISTED[@]}"; do
         check_untouched
 
         # Values that the command may get.
-        case "${P_KIND[$name]}" in
+        case "${KIND[$P$name]}" in
             integer)
                 if [ -n "${RANGE[$name]:-}" ]; then
                     try any "$opt" "${args[@]}" "$opt" "${RANGE[$name]#* }"
@@ -277,7 +274,7 @@ for path in "${LISTED[@]}"; do
                 try any "$opt" "${args[@]}" "$opt=FALSE"
                 ;;
             text | list)
-                if [ "${P_KIND[$name]}" = list ]; then
+                if [ "${KIND[$P$name]}" = list ]; then
                     try any "$opt" "${args[@]}" "$opt" "$value" "$opt" "$value"
                 fi
                 # An empty value, an over-long one that is not UTF-8 either, and one that a
