@@ -110,14 +110,19 @@ void CallLog::Write(const HostRoot& root) {
     text_ += "}\n";
     int fd = OpenLocked(root, true);
     if (fd < 0) return;
-    if (ftruncate(fd, 0) == 0) {
-        for (size_t done = 0; done < text_.size();) {
-            ssize_t written = write(fd, text_.data() + done, text_.size() - done);
-            if (written < 0 && errno == EINTR) continue;
-            if (written <= 0) break;
-            done += static_cast<size_t>(written);
-        }
+    // Written over the last log and then cut to its length, never emptied first: ext4 takes
+    // a file cut to nothing and written again for a replaced file and starts writing it to the
+    // disk at close, which each invocation would wait for.
+    size_t done = 0;
+    while (done < text_.size()) {
+        ssize_t written = pwrite(fd, text_.data() + done, text_.size() - done, off_t(done));
+        if (written < 0 && errno == EINTR) continue;
+        if (written <= 0) break;
+        done += static_cast<size_t>(written);
     }
+    // A log that could not be written whole is emptied rather than left mixed with the last.
+    bool whole = done == text_.size() && ftruncate(fd, off_t(done)) == 0;
+    if (!whole) whole = ftruncate(fd, 0) == 0;
     close(fd);
 }
 
