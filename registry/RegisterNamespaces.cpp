@@ -5,9 +5,9 @@
 //      sources are picked up by CMake; a new area is added to MESK_COMMAND_AREAS in the root
 //      CMakeLists.txt);
 //   2. any host-control operation it needs that does not exist yet: its declaration in
-//      frame/hostctl/, the simulated host's answer in platform/hostctl/ (and docs/hostsim.md),
-//      and the test double in tests/double/MockHost.h (a line of MESK_INFO_OPERATIONS for an
-//      operation of the info object, a MOCK_METHOD of MockHost for a static one);
+//      frame/hostctl/, its row in platform/hostctl/Operations.h (which declares it for the
+//      simulated host and the test double), the simulated host's answer in the file of its
+//      area, and its name in docs/hostsim.md's list of operations;
 //   3. its header included and one AddCommand line below, at its place in the tree;
 //   4. docs/commands.md regenerated with scripts/gen-docs (tests/e2e/test_reference.sh fails
 //      while it is stale);

@@ -2,8 +2,10 @@
 //
 // The plug-in calls static operations (MeskPluginFactory::GetMeskPlugin, MeskInfo::GetMeskDisks,
 // the MeskUtil statics, the host UUID functions). Each forwards to the installed backend: the
-// simulated host by default, or a test double that a unit test installs. The pure conversions
-// have working default implementations here, so a backend overrides only what it simulates.
+// simulated host by default, or a test double that a unit test installs, which is why the
+// statics are virtual operations here. The MeskUtil statics are declared from their rows in
+// Operations.h; the pure conversions have working default implementations (HostCtl.cpp), so a
+// backend overrides only what it simulates.
 #pragma once
 
 #include <cstddef>
@@ -12,6 +14,7 @@
 #include <string>
 #include <vector>
 
+#include "Operations.h"
 #include "Visibility.h"
 #include "hostctl/MeskInfo.h"
 #include "hostctl/MeskPlugin.h"
@@ -19,40 +22,26 @@
 
 namespace HostCtlSim {
 
+#define HOSTCTL_BACKEND_OPERATION_(result, name, parameters, arguments) \
+    virtual result name parameters = 0;
+#define HOSTCTL_BACKEND_CONVERSION_(result, name, parameters, arguments) \
+    virtual result name parameters;
 class HOSTCTL_API HostBackend {
   public:
     virtual ~HostBackend();
 
     virtual std::unique_ptr<HostCtl::MeskPlugin> GetMeskPlugin() = 0;
     virtual void GetMeskDisks(std::vector<std::shared_ptr<HostCtl::Mesk::MeskDiskLun>>& luns) = 0;
-
-    virtual void GetInfoFromKOVRA(std::vector<HostCtl::Mesk::MeskMemberInfo>& members,
-                                  std::string& localNodeState, std::string& localNodeUuid,
-                                  std::string& localNodeHealthState,
-                                  uint64_t& membershipEntryRevision, std::string& membershipUuid,
-                                  std::string& masterUuid, std::string& backupUuid,
-                                  std::string& maintenanceModeState) = 0;
-    virtual void GetUnicastMode(bool& unicast) = 0;
-    virtual bool IsInStretchedCluster() = 0;
-    virtual void GetPreferredFaultDomainInfo(std::string& id, std::string& name) = 0;
-    virtual bool IsWitnessNode() = 0;
-    virtual std::string GetFaultDomainId() = 0;
-    virtual void DecomCancel() = 0;
-    virtual int32_t MeskExec(const std::string& command, const std::string& argument, bool flag1,
-                             bool flag2, bool flag3) = 0;
+    HOSTCTL_UTIL_OPERATIONS(HOSTCTL_BACKEND_OPERATION_)
 
     // Working defaults: local time, UUID and policy class conversions, UTF-8 counting,
     // random UUIDs through libuuid.
-    virtual std::string GetFormattedSystemDateTime();
-    virtual HostCtl::Mesk::Uuid StringToMeskUuid(const std::string& text);
-    virtual std::string MeskUuidToString(const HostCtl::Mesk::Uuid& uuid);
-    virtual size_t UTF8StringCharLength(const std::string& text);
-    virtual HostCtl::Mesk::MeskPolicyClass StringToMeskPolicyClass(const std::string& name);
-    virtual std::string MeskPolicyClassToString(HostCtl::Mesk::MeskPolicyClass policyClass);
-    virtual std::vector<HostCtl::Mesk::MeskPolicyClass> GetMeskPolicyClasses();
+    HOSTCTL_UTIL_CONVERSIONS(HOSTCTL_BACKEND_CONVERSION_)
     virtual char* UUID_CreateRandom();
     virtual char* UUID_PackText(const char* text, char* buffer, size_t length);
 };
+#undef HOSTCTL_BACKEND_OPERATION_
+#undef HOSTCTL_BACKEND_CONVERSION_
 
 // The backend the static entry points forward to. Without an installed one, the simulated
 // host (made on first use) serves.

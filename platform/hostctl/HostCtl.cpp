@@ -149,75 +149,14 @@ std::string StrPrintf(const char* format, ...) {
 namespace ZuvCtl {
 namespace Mesk {
 
-using HostCtlSim::CurrentBackend;
-
-void MeskUtil::GetInfoFromKOVRA(std::vector<HostCtl::Mesk::MeskMemberInfo>& members,
-                                std::string& localNodeState, std::string& localNodeUuid,
-                                std::string& localNodeHealthState,
-                                uint64_t& membershipEntryRevision, std::string& membershipUuid,
-                                std::string& masterUuid, std::string& backupUuid,
-                                std::string& maintenanceModeState) {
-    CurrentBackend().GetInfoFromKOVRA(members, localNodeState, localNodeUuid, localNodeHealthState,
-                                      membershipEntryRevision, membershipUuid, masterUuid,
-                                      backupUuid, maintenanceModeState);
-}
-
-void MeskUtil::GetUnicastMode(bool& unicast) {
-    CurrentBackend().GetUnicastMode(unicast);
-}
-
-std::string MeskUtil::GetFormattedSystemDateTime() {
-    return CurrentBackend().GetFormattedSystemDateTime();
-}
-
-Uuid MeskUtil::StringToMeskUuid(const std::string& text) {
-    return CurrentBackend().StringToMeskUuid(text);
-}
-
-std::string MeskUtil::MeskUuidToString(const Uuid& uuid) {
-    return CurrentBackend().MeskUuidToString(uuid);
-}
-
-size_t MeskUtil::UTF8StringCharLength(const std::string& text) {
-    return CurrentBackend().UTF8StringCharLength(text);
-}
-
-bool MeskUtil::IsInStretchedCluster() {
-    return CurrentBackend().IsInStretchedCluster();
-}
-
-void MeskUtil::GetPreferredFaultDomainInfo(std::string& id, std::string& name) {
-    CurrentBackend().GetPreferredFaultDomainInfo(id, name);
-}
-
-bool MeskUtil::IsWitnessNode() {
-    return CurrentBackend().IsWitnessNode();
-}
-
-std::string MeskUtil::GetFaultDomainId() {
-    return CurrentBackend().GetFaultDomainId();
-}
-
-void MeskUtil::DecomCancel() {
-    CurrentBackend().DecomCancel();
-}
-
-MeskPolicyClass MeskUtil::StringToMeskPolicyClass(const std::string& name) {
-    return CurrentBackend().StringToMeskPolicyClass(name);
-}
-
-std::string MeskUtil::MeskPolicyClassToString(MeskPolicyClass policyClass) {
-    return CurrentBackend().MeskPolicyClassToString(policyClass);
-}
-
-std::vector<MeskPolicyClass> MeskUtil::GetMeskPolicyClasses() {
-    return CurrentBackend().GetMeskPolicyClasses();
-}
-
-int32_t MeskUtil::MeskExec(const std::string& command, const std::string& argument, bool flag1,
-                           bool flag2, bool flag3) {
-    return CurrentBackend().MeskExec(command, argument, flag1, flag2, flag3);
-}
+// Each MeskUtil static forwards to the backend's operation of the same name.
+#define HOSTCTL_FORWARD_(result, name, parameters, arguments) \
+    result MeskUtil::name parameters {                        \
+        return HostCtlSim::CurrentBackend().name arguments;   \
+    }
+HOSTCTL_UTIL_OPERATIONS(HOSTCTL_FORWARD_)
+HOSTCTL_UTIL_CONVERSIONS(HOSTCTL_FORWARD_)
+#undef HOSTCTL_FORWARD_
 
 }  // namespace Mesk
 }  // namespace ZuvCtl

@@ -21,6 +21,7 @@
 
 namespace HostCtlSim {
 
+#define HOSTCTL_SIM_OPERATION_(result, name, parameters, arguments) result name parameters override;
 class SimHost : public HostBackend {
   public:
     struct Options {
@@ -48,26 +49,8 @@ class SimHost : public HostBackend {
     // The static entry points, answered by the file of their area (Operations.h).
     std::unique_ptr<HostCtl::MeskPlugin> GetMeskPlugin() override;
     void GetMeskDisks(std::vector<std::shared_ptr<HostCtl::Mesk::MeskDiskLun>>& luns) override;
-    void GetInfoFromKOVRA(std::vector<HostCtl::Mesk::MeskMemberInfo>& members,
-                          std::string& localNodeState, std::string& localNodeUuid,
-                          std::string& localNodeHealthState, uint64_t& membershipEntryRevision,
-                          std::string& membershipUuid, std::string& masterUuid,
-                          std::string& backupUuid, std::string& maintenanceModeState) override;
-    void GetUnicastMode(bool& unicast) override;
-    bool IsInStretchedCluster() override;
-    void GetPreferredFaultDomainInfo(std::string& id, std::string& name) override;
-    bool IsWitnessNode() override;
-    std::string GetFaultDomainId() override;
-    void DecomCancel() override;
-    int32_t MeskExec(const std::string& command, const std::string& argument, bool flag1,
-                     bool flag2, bool flag3) override;
-    std::string GetFormattedSystemDateTime() override;
-    HostCtl::Mesk::Uuid StringToMeskUuid(const std::string& text) override;
-    std::string MeskUuidToString(const HostCtl::Mesk::Uuid& uuid) override;
-    size_t UTF8StringCharLength(const std::string& text) override;
-    HostCtl::Mesk::MeskPolicyClass StringToMeskPolicyClass(const std::string& name) override;
-    std::string MeskPolicyClassToString(HostCtl::Mesk::MeskPolicyClass policyClass) override;
-    std::vector<HostCtl::Mesk::MeskPolicyClass> GetMeskPolicyClasses() override;
+    HOSTCTL_UTIL_OPERATIONS(HOSTCTL_SIM_OPERATION_)
+    HOSTCTL_UTIL_CONVERSIONS(HOSTCTL_SIM_OPERATION_)
     char* UUID_CreateRandom() override;
     char* UUID_PackText(const char* text, char* buffer, size_t length) override;
 
@@ -98,6 +81,7 @@ class SimHost : public HostBackend {
     CallLog log_;
     std::set<std::string> removedInterfaces_;
 };
+#undef HOSTCTL_SIM_OPERATION_
 
 // Runs `body` as the operation `op` of `host`: recorded, subject to injected failures, and
 // noted in the log when it throws.

@@ -24,7 +24,7 @@ class InfoForward : public Base {
   public:
     InfoForward(MockMeskInfo& target, int& released) : target_(target), released_(released) {}
     ~InfoForward() override { ++released_; }
-    MESK_INFO_OPERATIONS(MESK_FORWARD_OPERATION)
+    HOSTCTL_INFO_OPERATIONS(MESK_FORWARD_OPERATION)
 
   protected:
     MockMeskInfo& target_;
@@ -39,7 +39,7 @@ class BasicInfo : public InfoForward<HostCtl::Mesk::MeskInfo> {
 class ExtendedInfo : public InfoForward<HostCtl::Mesk::MeskInfo2> {
   public:
     using InfoForward::InfoForward;
-    MESK_INFO2_OPERATIONS(MESK_FORWARD_OPERATION)
+    HOSTCTL_INFO2_OPERATIONS(MESK_FORWARD_OPERATION)
 };
 
 class FakePlugin : public HostCtl::MeskPlugin {
@@ -80,17 +80,12 @@ MockHost::MockHost(MockMeskInfo& info) {
         ++pluginsMade;
         return std::unique_ptr<HostCtl::MeskPlugin>(std::make_unique<FakePlugin>(*this, info));
     }));
+#define MESK_AS_THE_LIBRARY(result, name, parameters, arguments) \
+    ON_CALL(*this, name).WillByDefault(Invoke([this] parameters { return Base::name arguments; }));
+    HOSTCTL_UTIL_CONVERSIONS(MESK_AS_THE_LIBRARY)
+#undef MESK_AS_THE_LIBRARY
     ON_CALL(*this, GetFormattedSystemDateTime()).WillByDefault(Invoke([] {
         return std::string("2026-11-22 10:00:00");
-    }));
-    ON_CALL(*this, StringToMeskUuid(_)).WillByDefault(Invoke([this](const std::string& t) {
-        return Base::StringToMeskUuid(t);
-    }));
-    ON_CALL(*this, MeskPolicyClassToString(_)).WillByDefault(Invoke([this](MeskPolicyClass c) {
-        return Base::MeskPolicyClassToString(c);
-    }));
-    ON_CALL(*this, GetMeskPolicyClasses()).WillByDefault(Invoke([this] {
-        return Base::GetMeskPolicyClasses();
     }));
     ON_CALL(*this, UUID_CreateRandom()).WillByDefault(Invoke([this] {
         return Base::UUID_CreateRandom();

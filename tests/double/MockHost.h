@@ -37,60 +37,8 @@ using HostCtl::Mesk::Uuid;
 using LunList = std::vector<std::shared_ptr<MeskDiskLun>>;
 using NicList = std::vector<std::unique_ptr<MeskZuvNicConfig2>>;
 
-// Every operation of the info object, once, as X(result, name, (parameters), (arguments)):
-// the mock and the proxies that commands get are both made from these lists.
-#define MESK_INFO_OPERATIONS(X)                                                            \
-    X(const MeskClusterConfig&, GetClusterConfig, (), ())                                  \
-    X(bool, IsWitness, (), ())                                                             \
-    X(MeskConfigGeneration, GetConfigGeneration, (), ())                                   \
-    X(void, JoinCluster, (const Uuid& a, bool b, const std::string& c, bool d, int32_t e), \
-      (a, b, c, d, e))                                                                     \
-    X(void, CreateCluster, (const std::string& a, bool b, bool c), (a, b, c))              \
-    X(void, LeaveCluster, (bool a), (a))                                                   \
-    X(void, RestoreClusterConfig, (bool a), (a))                                           \
-    X(void, SetPreferredFaultDomain, (const std::string& a), (a))                          \
-    X(void, GetUnicastWitnesses, (std::vector<std::string> & a), (a))                      \
-    X(void, AddUnicastAgent,                                                               \
-      (const std::string& a, bool b, bool c, const MeskIpAddress& d, int32_t e, bool f,    \
-       const std::string& g),                                                              \
-      (a, b, c, d, e, f, g))                                                               \
-    X(void, RefreshUnicastAgents, (), ())                                                  \
-    X(void, GetUnicastAgents, (std::vector<std::string> & a), (a))                         \
-    X(bool, RemoveUnicastAgent, (const std::string& a, const MeskIpAddress& b, int32_t c), \
-      (a, b, c))                                                                           \
-    X(bool, IsZuvNicInUse, (const std::string& a, const std::string& b), (a, b))           \
-    X(bool, RemoveZuvNic, (const std::string& a, bool b, const std::string& c), (a, b, c)) \
-    X(void, ClearNetworkConfig, (), ())                                                    \
-    X(void, RestoreNetworkConfig, (), ())                                                  \
-    X(void, GetMeskDiskUuids, (std::vector<Uuid> & a), (a))                                \
-    X(void, GetDiskInfo, (const Uuid& a, const LunList& b, MeskDiskInfo& c), (a, b, c))    \
-    X(void, AddDisks, (const std::string& a, const std::vector<std::string>& b), (a, b))   \
-    X(void, RemoveDisk, (const std::string& a, const std::string& b), (a, b))              \
-    X(void, RemoveDiskGroup, (const std::string& a, const std::string& b), (a, b))         \
-    X(void, RemoveDiskByUuid, (const std::string& a, const std::string& b), (a, b))        \
-    X(void, MountDiskGroup, (const std::string& a, bool b), (a, b))                        \
-    X(void, MountByUuid, (const std::string& a), (a))                                      \
-    X(void, MountDisk, (const std::string& a), (a))                                        \
-    X(void, UnmountDiskGroup, (const std::string& a, bool b), (a, b))                      \
-    X(void, UnmountDisk, (const std::string& a, bool b), (a, b))                           \
-    X(void, AddCapacityFlashTag, (const std::string& a), (a))                              \
-    X(void, RemoveCapacityFlashTag, (const std::string& a), (a))                           \
-    X(bool, GetAutoClaimMode, (), ())                                                      \
-    X(void, SetAutoClaimMode, (bool a), (a))                                               \
-    X(std::string, GetDatastoreName, (), ())                                               \
-    X(void, SetDatastoreName, (const std::string& a), (a))                                 \
-    X(std::string, GetFaultDomainName, (), ())                                             \
-    X(void, SetFaultDomainName, (const std::string& a), (a))                               \
-    X(void, ResetFaultDomainName, (), ())                                                  \
-    X(std::string, GetDefaultPolicy, (const std::string& a), (a))                          \
-    X(void, SetDefaultPolicy, (const std::string& a, const std::string& b), (a, b))        \
-    X(void, ClearDefaultPolicies, (), ())                                                  \
-    X(int64_t, GetResyncBandwidth, (), ())                                                 \
-    X(int64_t, GetResyncThrottle, (), ())                                                  \
-    X(void, SetResyncThrottle, (int64_t a), (a))
-#define MESK_INFO2_OPERATIONS(X)         \
-    X(NicList, GetZuvNicConfigs, (), ()) \
-    X(bool, SetZuvNicConfig, (const MeskZuvNicConfig2& a), (a))
+// The mocks, and the proxies that commands get, are made from the operation tables of the
+// simulated host (Operations.h): a new operation needs no line here.
 #define MESK_MOCK_OPERATION(result, name, parameters, arguments) \
     MOCK_METHOD(result, name, parameters, (override));
 #define MESK_FORWARD_OPERATION(result, name, parameters, arguments) \
@@ -103,8 +51,8 @@ class MockMeskInfo : public HostCtl::Mesk::MeskInfo2 {
     MockMeskInfo();
     ~MockMeskInfo() override;
 
-    MESK_INFO_OPERATIONS(MESK_MOCK_OPERATION)
-    MESK_INFO2_OPERATIONS(MESK_MOCK_OPERATION)
+    HOSTCTL_INFO_OPERATIONS(MESK_MOCK_OPERATION)
+    HOSTCTL_INFO2_OPERATIONS(MESK_MOCK_OPERATION)
 
     // What GetClusterConfig returns by default: not enabled, no UUID.
     MeskClusterConfig clusterConfig;
@@ -119,30 +67,16 @@ enum class InfoKind {
 
 class MockHost : public HostCtlSim::HostBackend {
   public:
-    // By default GetMeskPlugin hands out a plug-in whose info objects forward to `info`, and
-    // the conversions and UUID functions behave as the real library's (those not mocked here
-    // are the backend's own).
+    // By default GetMeskPlugin hands out a plug-in whose info objects forward to `info`, the
+    // system time is 2026-11-22 10:00:00, and the other conversions and the UUID functions
+    // behave as the real library's.
     explicit MockHost(MockMeskInfo& info);
     ~MockHost() override;
 
     MOCK_METHOD(std::unique_ptr<HostCtl::MeskPlugin>, GetMeskPlugin, (), (override));
     MOCK_METHOD(void, GetMeskDisks, (LunList&), (override));
-    MOCK_METHOD(void, GetInfoFromKOVRA,
-                (std::vector<MeskMemberInfo>&, std::string&, std::string&, std::string&, uint64_t&,
-                 std::string&, std::string&, std::string&, std::string&),
-                (override));
-    MOCK_METHOD(void, GetUnicastMode, (bool&), (override));
-    MOCK_METHOD(bool, IsInStretchedCluster, (), (override));
-    MOCK_METHOD(void, GetPreferredFaultDomainInfo, (std::string&, std::string&), (override));
-    MOCK_METHOD(bool, IsWitnessNode, (), (override));
-    MOCK_METHOD(std::string, GetFaultDomainId, (), (override));
-    MOCK_METHOD(void, DecomCancel, (), (override));
-    MOCK_METHOD(int32_t, MeskExec, (const std::string&, const std::string&, bool, bool, bool),
-                (override));
-    MOCK_METHOD(std::string, GetFormattedSystemDateTime, (), (override));
-    MOCK_METHOD(Uuid, StringToMeskUuid, (const std::string&), (override));
-    MOCK_METHOD(std::string, MeskPolicyClassToString, (MeskPolicyClass), (override));
-    MOCK_METHOD(std::vector<MeskPolicyClass>, GetMeskPolicyClasses, (), (override));
+    HOSTCTL_UTIL_OPERATIONS(MESK_MOCK_OPERATION)
+    HOSTCTL_UTIL_CONVERSIONS(MESK_MOCK_OPERATION)
     MOCK_METHOD(char*, UUID_CreateRandom, (), (override));
     MOCK_METHOD(char*, UUID_PackText, (const char*, char*, size_t), (override));
 
