@@ -65,7 +65,11 @@ std::vector<std::string> PluginFiles(const std::string& directory) {
 // cannot. The library is never closed: the tree will hold objects whose code lives in it.
 void* OpenPlugin(const std::string& path, AutoCli_RegisterNamespacesFn& entry,
                  PluginReport& report) {
-    void* handle = dlopen(path.c_str(), RTLD_NOW | RTLD_LOCAL);
+    // Functions are bound lazily: one command calls a few dozen of the hundreds that a plug-in
+    // and its libraries import, and binding them all here took a tenth of `autocli --help`.
+    // References from data (the commands' virtual tables among them) are still bound here, so
+    // a plug-in built against another framework is still refused with the loader's reason.
+    void* handle = dlopen(path.c_str(), RTLD_LAZY | RTLD_LOCAL);
     if (handle == nullptr) {
         const char* reason = dlerror();
         report.problems.push_back("cannot load plug-in " + path + ": " +
