@@ -55,6 +55,7 @@ Commands:
                               a host in a cluster with N disks claimed into disk groups of one
                               SSD and up to seven HDDs, N unicast agents and N interfaces
   --help                      this text
+  --version                   hostsim's version
 )";
 
 class UsageError : public std::runtime_error {
@@ -297,6 +298,10 @@ int main(int argc, char** argv) {
     if (args[0] == "--help" || args[0] == "-h" || args[0] == "help") {
         std::cout << kUsage;
         return 0;
+    }
+    if (args.size() == 1 && args[0] == "--version") {
+        std::cout << "hostsim " HOSTSIM_VERSION "\n";
+        return std::cout.flush() ? 0 : 1;
     }
     std::string command = args[0];
     args.erase(args.begin());

@@ -26,6 +26,15 @@ class SimPlugin : public HostCtl::MeskPlugin {
     SimHost& host_;
 };
 
+// The simulated host's files live below its root, never at the host paths themselves. A
+// process that loads this library (autocli with the plug-in, hostsim) therefore has
+// MESK_HOST_ROOT name that root even when nobody set it, so that the plug-in, the scripts run
+// through MeskExec and hostsim all reach the same files; run before any command.
+__attribute__((constructor)) void ExportDefaultHostRoot() {
+    const char* root = std::getenv("MESK_HOST_ROOT");
+    if (root == nullptr || *root == '\0') setenv("MESK_HOST_ROOT", kDefaultHostRoot, 1);
+}
+
 }  // namespace
 
 [[noreturn]] void Refuse(const std::string& message) {

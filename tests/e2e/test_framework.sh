@@ -12,6 +12,17 @@ expect_eq "$EXPORTS" "AutoCli_RegisterNamespaces" "symbols that libmesk.so defin
 PLUGINS="${MESK_TEST_PLUGIN_DIR:-$(dirname "$AUTOCLI")/../../test-plugins}"
 export AUTOCLI_PLUGIN_PATH="$PLUGINS"
 
+case_ "--version names autocli's version and each plug-in's, from the plug-in's own note"
+MESK_DIR="${MESK_PLUGINS%%:*}"
+AUTOCLI_PLUGIN_PATH="$MESK_DIR:$PLUGINS" run --version
+expect_rc 0
+VERSION=$(sed -n 's/^autocli \([0-9][0-9.]*\)$/\1/p' <<<"$OUT")
+expect_eq "$(grep -c . <<<"$VERSION")" 1 "autocli's version line"
+expect_out_has "plug-in mesk $VERSION: $MESK_DIR/libmesk.so"
+expect_out_has "plug-in without a version: $PLUGINS/libother_mesk_plugin.so"
+sim --version
+expect_out "hostsim $VERSION"
+
 case_ "help of the root, a namespace and a command"
 ok --help
 expect_out_has "mesk  Other mesk"

@@ -18,6 +18,21 @@ else
     head -n 80 "$E2E_DIR/reference.diff" >&2
 fi
 
+case_ "the manual pages match the tools and render without warnings"
+RC=0
+"$MESK_SOURCE_DIR/scripts/gen-man" "$MESK_BUILD_DIR" "$E2E_DIR/man" 2>"$E2E_DIR/man.err" || RC=$?
+ERR=$(cat "$E2E_DIR/man.err")
+expect_rc 0
+for page in autocli hostsim autocli-mesk; do
+    if diff -u "$MESK_SOURCE_DIR/docs/man/$page.1" "$E2E_DIR/man/$page.1" >"$E2E_DIR/man.diff"; then
+        _pass
+    else
+        _fail "docs/man/$page.1 is stale; regenerate it with: scripts/gen-docs $MESK_BUILD_DIR"
+        head -n 40 "$E2E_DIR/man.diff" >&2
+    fi
+    expect_eq "$(LC_ALL=C.UTF-8 groff -ww -z -man -Tutf8 "$E2E_DIR/man/$page.1" 2>&1)" "" "groff on $page.1"
+done
+
 case_ "README's layout table names every folder"
 cd "$MESK_SOURCE_DIR"
 TABLE=$(grep '^| `' README.md)

@@ -27,9 +27,9 @@ struct GlobalOption {
 };
 
 const GlobalOption kGlobalOptions[] = {
-    {"--formatter", true, true},   {"--fields", true, true}, {"--no-header", false, true},
-    {"--debug", false, true},      {"--help", false, true},  {"--list-commands", false, false},
-    {"--reference", false, false}, {"-h", false, true},
+    {"--formatter", true, true},   {"--fields", true, true},    {"--no-header", false, true},
+    {"--debug", false, true},      {"--help", false, true},     {"--list-commands", false, false},
+    {"--reference", false, false}, {"--version", false, false}, {"-h", false, true},
 };
 
 // The global option that `word` names, with or without "=value".

@@ -120,6 +120,7 @@ std::string RenderNamespaceHelp(const NamespaceNode& node) {
                     {"--no-header", "Leave out the header row of table and csv output"},
                     {"--list-commands", "Print every command path, one per line"},
                     {"--reference", "Print the command reference as Markdown"},
+                    {"--version", "Print the versions of autocli and of each plug-in"},
                     {"--debug", "Report on stderr whether the command completed its output"},
                     {"-h, --help", "Show the help of a namespace or command"},
                 });

@@ -3,10 +3,12 @@
 
 #include <dirent.h>
 #include <dlfcn.h>
+#include <link.h>
 #include <sys/stat.h>
 #include <unistd.h>
 
 #include <algorithm>
+#include <cstring>
 #include <exception>
 #include <set>
 
@@ -125,6 +127,49 @@ void LoadPlugins(const std::vector<std::string>& directories,
             }
         }
     }
+}
+
+namespace {
+
+struct NoteSearch {
+    const std::string* path;
+    std::string text;
+};
+
+// The text of the first note of type 1 owned by "AutoCli" in a loaded object's PT_NOTE
+// segments.
+int FindNote(dl_phdr_info* object, size_t, void* data) {
+    auto* search = static_cast<NoteSearch*>(data);
+    if (object->dlpi_name == nullptr || *search->path != object->dlpi_name) return 0;
+    static const char kOwner[] = "AutoCli";
+    for (int i = 0; i < object->dlpi_phnum; ++i) {
+        const ElfW(Phdr)& segment = object->dlpi_phdr[i];
+        if (segment.p_type != PT_NOTE) continue;
+        const char* at = reinterpret_cast<const char*>(object->dlpi_addr + segment.p_vaddr);
+        const char* end = at + segment.p_memsz;
+        while (end - at >= static_cast<ptrdiff_t>(sizeof(ElfW(Nhdr)))) {
+            const auto* note = reinterpret_cast<const ElfW(Nhdr)*>(at);
+            const char* owner = at + sizeof(ElfW(Nhdr));
+            const char* text = owner + ((note->n_namesz + 3) & ~3u);
+            const char* next = text + ((note->n_descsz + 3) & ~3u);
+            if (next > end) break;
+            if (note->n_type == 1 && note->n_namesz == sizeof kOwner &&
+                std::memcmp(owner, kOwner, sizeof kOwner) == 0) {
+                search->text.assign(text, strnlen(text, note->n_descsz));
+                return 1;
+            }
+            at = next;
+        }
+    }
+    return 1;
+}
+
+}  // namespace
+
+std::string PluginVersion(const std::string& path) {
+    NoteSearch search{&path, std::string()};
+    dl_iterate_phdr(FindNote, &search);
+    return search.text;
 }
 
 bool LoadPlugin(const std::string& path, const std::shared_ptr<NamespaceNode>& root,

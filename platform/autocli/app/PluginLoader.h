@@ -34,6 +34,10 @@ struct PluginReport {
 void LoadPlugins(const std::vector<std::string>& directories,
                  const std::shared_ptr<NamespaceNode>& root, PluginReport& report);
 
+// The name and version that a loaded plug-in states in its "AutoCli" note ("mesk 0.1.0"), or
+// the empty text when it states none.
+std::string PluginVersion(const std::string& path);
+
 // Loads one library and registers it. Returns false, with a problem in `report`, when it
 // cannot be loaded, lacks the entry point, or the entry point throws.
 bool LoadPlugin(const std::string& path, const std::shared_ptr<NamespaceNode>& root,

@@ -51,6 +51,17 @@ int main(int argc, char** argv) {
         WriteAll(STDERR_FILENO, problems);
     }
 
+    if (argc == 2 && std::strcmp(argv[1], "--version") == 0) {
+        std::string text = std::string("autocli ") + AUTOCLI_VERSION + "\n";
+        for (const auto& path : report.loaded) {
+            std::string version = App::PluginVersion(path);
+            text +=
+                "plug-in " + (version.empty() ? "without a version" : version) + ": " + path + "\n";
+        }
+        WriteAll(STDOUT_FILENO, text);
+        return 0;
+    }
+
     App::RunResult result = App::Run(std::vector<std::string>(argv + 1, argv + argc), root);
     WriteAll(STDOUT_FILENO, result.out);
     WriteAll(STDERR_FILENO, result.err);

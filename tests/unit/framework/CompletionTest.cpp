@@ -53,7 +53,7 @@ TEST(Completion, CandidatesAndDirectiveAtEachLevel) {
         {"--formatter json mesk --debug other h", "hello", 4},
         {"mesk nope ", "", 1},
         // Global options and their values.
-        {"-", globals + " --list-commands --reference -h", 4},
+        {"-", globals + " --list-commands --reference --version -h", 4},
         {"--formatter js", "json json-pretty", 4},
         // A command's options: long names, short ones once "-" is typed, given ones left out
         // unless repeatable.
