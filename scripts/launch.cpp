@@ -3,6 +3,7 @@
 // runs the tool at once (a stat per source, no shell, no build system); otherwise it has
 // scripts/ensure-built bring build/ up to date first. Either way the tool runs on the
 // checkout's simulated host, .hostsim/, unless HOSTSIM_STATE and MESK_HOST_ROOT say otherwise.
+#include <fcntl.h>
 #include <sys/stat.h>
 #include <sys/wait.h>
 #include <unistd.h>
@@ -20,21 +21,31 @@ bool NotOlder(const timespec& a, const timespec& b) {
     return a.tv_sec > b.tv_sec || (a.tv_sec == b.tv_sec && a.tv_nsec >= b.tv_nsec);
 }
 
-// True when the stamp exists and every watched path exists and is older than it. The stamp
-// is taken when a build starts, so a source saved during the build counts as changed.
-bool UpToDate(const std::string& build) {
+// True when the stamp exists and every watched path (relative to the checkout, one a line)
+// exists and is older than it. The stamp is taken when a build starts, so a source saved
+// during the build counts as changed.
+bool UpToDate(const std::string& root) {
+    const int top = open(root.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC);
+    if (top < 0) return false;
     struct stat stamp;
-    if (stat((build + "/.tools-built").c_str(), &stamp) != 0) return false;
-    FILE* list = std::fopen((build + "/.tools-watch").c_str(), "re");
-    if (list == nullptr) return false;
-    bool fresh = true;
-    char line[PATH_MAX + 2];
-    while (fresh && std::fgets(line, sizeof line, list) != nullptr) {
-        line[std::strcspn(line, "\n")] = '\0';
+    bool fresh = fstatat(top, "build/.tools-built", &stamp, 0) == 0;
+    const int list = fresh ? openat(top, "build/.tools-watch", O_RDONLY | O_CLOEXEC) : -1;
+    std::string paths;
+    char chunk[16384];
+    ssize_t n = 0;
+    while (list >= 0 && (n = read(list, chunk, sizeof chunk)) > 0) paths.append(chunk, n);
+    fresh = fresh && list >= 0 && n == 0 && !paths.empty();
+    if (list >= 0) close(list);
+    for (size_t start = 0; fresh && start < paths.size();) {
+        size_t end = paths.find('\n', start);
+        if (end == std::string::npos) end = paths.size();
+        paths[end] = '\0';
         struct stat source;
-        fresh = stat(line, &source) == 0 && !NotOlder(source.st_mtim, stamp.st_mtim);
+        fresh = fstatat(top, paths.c_str() + start, &source, 0) == 0 &&
+                !NotOlder(source.st_mtim, stamp.st_mtim);
+        start = end + 1;
     }
-    std::fclose(list);
+    close(top);
     return fresh;
 }
 
@@ -98,7 +109,7 @@ int main(int argc, char** argv) {
         return 2;
     }
 
-    if (!UpToDate(build)) {
+    if (!UpToDate(root)) {
         const int status = EnsureBuilt(root);
         if (status != 0) return status;
     }

@@ -24,6 +24,18 @@ section_commands() {
         inside && block { sub(/ +# .*/, ""); print }' README.md
 }
 
+case_ "without root and without sudo, the set-up names what is missing and changes nothing"
+FAKE="$E2E_DIR/fakebin"
+mkdir -p "$FAKE"
+printf '#!/bin/sh\necho 1000\n' >"$FAKE/id"
+printf '#!/bin/sh\nexit 1\n' >"$FAKE/dpkg-query"
+printf '#!/bin/sh\ntouch "%s/apt-get-ran"\n' "$E2E_DIR" >"$FAKE/apt-get"
+chmod +x "$FAKE"/*
+_capture env PATH="$FAKE" "$BASH" scripts/install-deps build
+expect_rc 1
+expect_err_has "apt-get install --no-install-recommends g++ cmake ninja-build"
+expect_eq "$([ -e "$E2E_DIR/apt-get-ran" ] && echo ran)" "" "apt-get"
+
 case_ "the first command builds, says so on stderr, and runs"
 FIRST=$(sed -n '/^```sh$/{n;p;q}' README.md | sed 's/ *#.*//')
 expect_eq "$FIRST" "./autocli mesk cluster get" "README's first command"
