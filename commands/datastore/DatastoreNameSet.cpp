@@ -1,4 +1,4 @@
-#include "commands/settings/DatastoreNameSet.h"
+#include "commands/datastore/DatastoreNameSet.h"
 
 #include "MeskConstants.h"
 #include "hostctl/MeskCtlException.h"

@@ -1,4 +1,4 @@
-#include "commands/settings/FaultDomainGet.h"
+#include "commands/faultdomain/FaultDomainGet.h"
 
 #include <string>
 

@@ -1,10 +1,7 @@
 #include "MockHost.h"
-#include "commands/settings/DatastoreNameGet.h"
-#include "commands/settings/DatastoreNameSet.h"
-#include "commands/settings/FaultDomainGet.h"
-#include "commands/settings/FaultDomainReset.h"
-#include "commands/settings/FaultDomainSet.h"
-#include "commands/settings/MaintenanceModeCancel.h"
+#include "commands/faultdomain/FaultDomainGet.h"
+#include "commands/faultdomain/FaultDomainReset.h"
+#include "commands/faultdomain/FaultDomainSet.h"
 
 namespace OrvaneCli {
 namespace MeskNamespace {
@@ -14,18 +11,15 @@ using Kalmor::AutoCli::Command;
 using namespace MeskTest;
 using ::testing::_;
 using ::testing::Return;
-using SettingsTest = HostTest;
+using FaultDomainTest = HostTest;
 
-// Each command with the library answering and failing. The setters and reset answer true
-// even after a failure, cancel answers false; the getters then leave no result.
-TEST_F(SettingsTest, EachCommandWithAndWithoutALibraryFailure) {
-    ON_CALL(info, GetDatastoreName()).WillByDefault(Record("GetDatastoreName", std::string("ds")));
+// Each command with the library answering and failing. The setter and reset answer true
+// even after a failure; the getter then leaves no result.
+TEST_F(FaultDomainTest, EachCommandWithAndWithoutALibraryFailure) {
     ON_CALL(info, GetFaultDomainName())
         .WillByDefault(Record("GetFaultDomainName", std::string("r1")));
-    ON_CALL(info, SetDatastoreName(_)).WillByDefault(Record("SetDatastoreName"));
     ON_CALL(info, SetFaultDomainName(_)).WillByDefault(Record("SetFaultDomainName"));
     ON_CALL(info, ResetFaultDomainName()).WillByDefault(Record("ResetFaultDomainName"));
-    ON_CALL(host, DecomCancel()).WillByDefault(Record("DecomCancel"));
     // Asked for only in a cluster.
     ON_CALL(host, GetFaultDomainId()).WillByDefault(Return("id"));
     std::string bytes256;  // 128 two-byte characters: the limit counts bytes
@@ -36,10 +30,6 @@ TEST_F(SettingsTest, EachCommandWithAndWithoutALibraryFailure) {
         std::string options, calls, answered, failed;
         int plugins;
     } cases[] = {
-        {DatastoreNameGet::New(), "", "GetDatastoreName()", "{Name=ds}, complete",
-         "Unable to get Mesk datastore name: x; no result, incomplete", 1},
-        {DatastoreNameSet::New(), "newname=n", "SetDatastoreName(n)", "true, complete",
-         "Unable to set Mesk datastore name: x; true, complete", 1},
         {FaultDomainGet::New(), "", "GetFaultDomainName()",
          "{faultDomainName=r1, faultDomainId=}, complete",
          "Unable to get fault domain name: x; no result, incomplete", 1},
@@ -50,9 +40,6 @@ TEST_F(SettingsTest, EachCommandWithAndWithoutALibraryFailure) {
         {FaultDomainSet::New(), "fdname=" + bytes256 + "a", "", tooLong, tooLong, 0},
         {FaultDomainReset::New(), "", "ResetFaultDomainName()", "true, complete",
          "Unable to reset fault domain name; true, complete", 1},
-        // A static operation of the library: no plug-in object is made.
-        {MaintenanceModeCancel::New(), "", "DecomCancel()", "true, complete", "x; false, complete",
-         0},
     };
     for (const auto& c : cases) {
         SCOPED_TRACE(c.command->GetDescription());

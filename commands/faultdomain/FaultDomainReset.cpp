@@ -1,4 +1,4 @@
-#include "commands/settings/FaultDomainReset.h"
+#include "commands/faultdomain/FaultDomainReset.h"
 
 #include "MeskConstants.h"
 #include "hostctl/MeskCtlException.h"

@@ -1,4 +1,4 @@
-#include "commands/settings/FaultDomainSet.h"
+#include "commands/faultdomain/FaultDomainSet.h"
 
 #include <cstddef>
 #include <string>

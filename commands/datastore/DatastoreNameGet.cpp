@@ -1,4 +1,4 @@
-#include "commands/settings/DatastoreNameGet.h"
+#include "commands/datastore/DatastoreNameGet.h"
 
 #include "MeskConstants.h"
 #include "hostctl/MeskCtlException.h"

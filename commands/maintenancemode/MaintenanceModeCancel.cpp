@@ -1,4 +1,4 @@
-#include "commands/settings/MaintenanceModeCancel.h"
+#include "commands/maintenancemode/MaintenanceModeCancel.h"
 
 #include "MeskConstants.h"
 #include "hostctl/MeskCtlException.h"
