@@ -7,3 +7,8 @@
 
 #define KALMOR_API __attribute__((visibility("default")))
 #define HOSTCTL_API __attribute__((visibility("default")))
+
+// Marks a plug-in's entry point: C linkage, and exported although the plug-in's other symbols
+// are hidden. Every plug-in defines it as `AUTOCLI_PLUGIN_ENTRY void AutoCli_RegisterNamespaces(
+// std::shared_ptr<Kalmor::AutoCli::NamespaceNode>* root)`.
+#define AUTOCLI_PLUGIN_ENTRY extern "C" __attribute__((visibility("default")))

@@ -115,8 +115,7 @@ std::shared_ptr<Namespace> MakeIpNamespace(const std::string& description) {
 }  // namespace
 
 // Each sub-namespace is registered on its parent only once all its children are in it.
-extern "C" __attribute__((visibility("default"))) void AutoCli_RegisterNamespaces(
-    std::shared_ptr<NamespaceNode>* rootHandle) {
+AUTOCLI_PLUGIN_ENTRY void AutoCli_RegisterNamespaces(std::shared_ptr<NamespaceNode>* rootHandle) {
     NamespaceNode& root = *rootHandle->get();
     std::shared_ptr<Namespace> mesk = FindOrMakeMesk(root);
     mesk->SetDescription("Orvane Mesk commands");

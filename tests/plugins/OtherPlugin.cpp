@@ -116,8 +116,7 @@ class OtherHello : public virtual Command {
 
 }  // namespace
 
-extern "C" __attribute__((visibility("default"))) void AutoCli_RegisterNamespaces(
-    std::shared_ptr<NamespaceNode>* root) {
+AUTOCLI_PLUGIN_ENTRY void AutoCli_RegisterNamespaces(std::shared_ptr<NamespaceNode>* root) {
     std::shared_ptr<NamespaceNode> mesk = (*root)->GetNamespaceNode("mesk");
     if (!mesk) {
         mesk = Namespace::New();
