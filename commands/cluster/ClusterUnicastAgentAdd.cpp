@@ -41,6 +41,7 @@ std::shared_ptr<InputSpec> ClusterUnicastAgentAdd::GetInputSpecInternal() {
 
     auto type = ParameterSpec::New("type", Kalmor::CallSpec::PARAM_STRING);
     type->SetShortName("t");
+    type->SetRequired(false);
     type->SetDescription("Type of the unicast agent (One of %ENUM%, default is witness).");
     auto types = ParameterConstraint::New(Kalmor::CallSpec::CONSTRAINT_STRING_ENUM);
     types->AddStringEnum("witness", "");
@@ -50,11 +51,13 @@ std::shared_ptr<InputSpec> ClusterUnicastAgentAdd::GetInputSpecInternal() {
 
     auto uuid = ParameterSpec::New("uuid", Kalmor::CallSpec::PARAM_STRING);
     uuid->SetShortName("u");
+    uuid->SetRequired(false);
     uuid->SetDescription("UUID of the unicast agent (required for -t node).");
     spec->AddParameter(uuid);
 
     auto unicast = ParameterSpec::New("supports-unicast", Kalmor::CallSpec::PARAM_BOOL);
     unicast->SetShortName("U");
+    unicast->SetRequired(false);
     unicast->SetDescription("Whether the software version supports unicast (required for -t node)");
     spec->AddParameter(unicast);
 
@@ -66,11 +69,13 @@ std::shared_ptr<InputSpec> ClusterUnicastAgentAdd::GetInputSpecInternal() {
 
     auto port = ParameterSpec::New("port", Kalmor::CallSpec::PARAM_INT);
     port->SetShortName("p");
+    port->SetRequired(false);
     port->SetDescription("Port the unicast agent is listening on.");
     spec->AddParameter(port);
 
     auto iface = ParameterSpec::New("bound-interface-name", Kalmor::CallSpec::PARAM_STRING);
     iface->SetShortName("i");
+    iface->SetRequired(false);
     iface->SetDescription("Name of the bound outgoing network interface.");
     spec->AddParameter(iface);
 

@@ -38,6 +38,7 @@ std::shared_ptr<InputSpec> ClusterUnicastAgentRemove::GetInputSpecInternal() {
 
     auto uuid = ParameterSpec::New("uuid", Kalmor::CallSpec::PARAM_STRING);
     uuid->SetShortName("u");
+    uuid->SetRequired(false);
     uuid->SetDescription("UUID of the unicast agent.");
     spec->AddParameter(uuid);
 
@@ -49,6 +50,7 @@ std::shared_ptr<InputSpec> ClusterUnicastAgentRemove::GetInputSpecInternal() {
 
     auto port = ParameterSpec::New("port", Kalmor::CallSpec::PARAM_INT);
     port->SetShortName("p");
+    port->SetRequired(false);
     port->SetDescription("Port the unicast agent is listening on.");
     spec->AddParameter(port);
 

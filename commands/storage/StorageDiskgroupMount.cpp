@@ -31,6 +31,7 @@ std::shared_ptr<InputSpec> StorageDiskgroupMount::GetInputSpecInternal() {
 
     auto ssd = ParameterSpec::New("ssd", Kalmor::CallSpec::PARAM_STRING);
     ssd->SetShortName("s");
+    ssd->SetRequired(false);
     ssd->SetDescription(
         "Specify a disk group's fronting ssd to mount the ssd and each backing hdd for use by "
         "Mesk.e.g.: mpx.pthba2:C0:T1:L0");
@@ -38,11 +39,13 @@ std::shared_ptr<InputSpec> StorageDiskgroupMount::GetInputSpecInternal() {
 
     auto disk = ParameterSpec::New("disk", Kalmor::CallSpec::PARAM_STRING);
     disk->SetShortName("d");
+    disk->SetRequired(false);
     disk->SetDescription("Specify the disk to mount for use by Mesk.e.g.: mpx.pthba0:C0:T1:L0");
     spec->AddParameter(disk);
 
     auto uuid = ParameterSpec::New("uuid", Kalmor::CallSpec::PARAM_STRING);
     uuid->SetShortName("u");
+    uuid->SetRequired(false);
     uuid->SetDescription(
         "Specify a Mesk UUID of the disk or fronting ssd to mount for use by Mesk.e.g.: "
         "5291022a-ad03-df90-dd0f-b9f980cc005e");

@@ -31,6 +31,7 @@ std::shared_ptr<InputSpec> StorageDiskgroupUmount::GetInputSpecInternal() {
 
     auto ssd = ParameterSpec::New("ssd", Kalmor::CallSpec::PARAM_STRING);
     ssd->SetShortName("s");
+    ssd->SetRequired(false);
     ssd->SetDescription(
         "Specify a disk group's fronting ssd to unmount the ssd and each backing hdd from Mesk "
         "usage.e.g.: mpx.pthba2:C0:T1:L0");
@@ -38,6 +39,7 @@ std::shared_ptr<InputSpec> StorageDiskgroupUmount::GetInputSpecInternal() {
 
     auto disk = ParameterSpec::New("disk", Kalmor::CallSpec::PARAM_STRING);
     disk->SetShortName("d");
+    disk->SetRequired(false);
     disk->SetDescription("Specify the hdd to unmount from Mesk usage.e.g.: mpx.pthba0:C0:T1:L0");
     spec->AddParameter(disk);
 

@@ -52,6 +52,7 @@ std::shared_ptr<InputSpec> StorageList::GetInputSpecInternal() {
 
     auto device = ParameterSpec::New("device", Kalmor::CallSpec::PARAM_STRING);
     device->SetShortName("d");
+    device->SetRequired(false);
     device->SetDescription(
         "Filter the output of this command to only show a single device with specified device "
         "name.");
@@ -59,6 +60,7 @@ std::shared_ptr<InputSpec> StorageList::GetInputSpecInternal() {
 
     auto uuid = ParameterSpec::New("uuid", Kalmor::CallSpec::PARAM_STRING);
     uuid->SetShortName("u");
+    uuid->SetRequired(false);
     uuid->SetDescription(
         "Filter the output of this command to only show a single device with specified uuid.");
     spec->AddParameter(uuid);

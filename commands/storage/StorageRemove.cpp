@@ -43,12 +43,14 @@ std::shared_ptr<InputSpec> StorageRemove::GetInputSpecInternal() {
 
     auto disk = ParameterSpec::New("disk", Kalmor::CallSpec::PARAM_STRING);
     disk->SetShortName("d");
+    disk->SetRequired(false);
     disk->SetDescription(
         "Specify individual hdd to remove from Mesk usage.e.g.: mpx.pthba2:C0:T1:L0");
     spec->AddParameter(disk);
 
     auto ssd = ParameterSpec::New("ssd", Kalmor::CallSpec::PARAM_STRING);
     ssd->SetShortName("s");
+    ssd->SetRequired(false);
     ssd->SetDescription(
         "Specify a disk group's fronting ssd to remove the ssd and each backing hdd from Mesk "
         "usage.e.g.: mpx.pthba2:C0:T1:L0");
@@ -56,12 +58,14 @@ std::shared_ptr<InputSpec> StorageRemove::GetInputSpecInternal() {
 
     auto uuid = ParameterSpec::New("uuid", Kalmor::CallSpec::PARAM_STRING);
     uuid->SetShortName("u");
+    uuid->SetRequired(false);
     uuid->SetDescription("Specify UUID of Mesk disk.e.g.: 52afa1de-4240-d5d6-17f9-8af1ec8509e5");
     spec->AddParameter(uuid);
 
     // The modes are checked by the command, not declared as an enumeration.
     auto mode = ParameterSpec::New("evacuation-mode", Kalmor::CallSpec::PARAM_STRING);
     mode->SetShortName("m");
+    mode->SetRequired(false);
     mode->SetDescription(
         "Action the Mesk service must take before the host can enter maintenance mode (default "
         "noAction). Allowed values are:\n"

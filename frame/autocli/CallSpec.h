@@ -61,6 +61,8 @@ class KALMOR_API ParameterSpec {
     virtual ~ParameterSpec();
 
     void SetShortName(const std::string& shortName);  // a single letter
+    // A parameter is required unless the command calls SetRequired(false): an option that a
+    // command forgot to mark can then not be left out unnoticed.
     void SetRequired(bool required);
     void SetDescription(const std::string& description);
     void SetConstraint(std::shared_ptr<ParameterConstraint> constraint);
@@ -77,7 +79,7 @@ class KALMOR_API ParameterSpec {
     std::string name_;
     ParameterType type_ = PARAM_STRING;
     std::string shortName_;
-    bool required_ = false;
+    bool required_ = true;
     std::string description_;
     std::shared_ptr<ParameterConstraint> constraint_;
 };

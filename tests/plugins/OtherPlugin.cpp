@@ -47,6 +47,7 @@ class OtherHello : public virtual Command {
                            const char* shortName, const char* description) {
             auto parameter = ParameterSpec::New(name, type);
             parameter->SetShortName(shortName);
+            parameter->SetRequired(false);
             parameter->SetDescription(description);
             spec->AddParameter(parameter);
             return parameter;

@@ -21,9 +21,15 @@ bool StartsWith(const std::string& text, const char* prefix) {
     return text.rfind(prefix, 0) == 0;
 }
 
-// A word that cannot be the value of the option before it: another long option.
+bool IsHelpFlag(const std::string& word) {
+    return word == "--help" || word == "-h";
+}
+
+// A word that cannot be the value of the option before it: another long option, or -h, which
+// asks for help whichever way it is spelt. Other words that begin with a dash, negative
+// numbers among them, are values.
 bool LooksLikeLongOption(const std::string& word) {
-    return StartsWith(word, "--");
+    return StartsWith(word, "--") || IsHelpFlag(word);
 }
 
 // Matches `--name value` and `--name=value` at words[index], moving `index` past them.
@@ -227,9 +233,22 @@ std::string CheckDeclarations(const InputSpec& spec) {
 
 }  // namespace
 
+std::vector<std::string> GlobalOptionNames() {
+    return {"--help",      "--list-commands", "--reference", "--debug",
+            "--no-header", "--formatter",     "--fields",    "--version"};
+}
+
 bool TakeGlobalOption(const std::vector<std::string>& words, size_t& index, GlobalOptions& globals,
                       std::string& error) {
     const std::string& word = words[index];
+    // Asking for documentation twice is harmless; any other global option given twice is
+    // refused like a repeated command option, since only one of the two could be honoured.
+    const std::string name = word.substr(0, word.find('='));
+    const bool documentation =
+        IsHelpFlag(name) || name == "--list-commands" || name == "--reference";
+    if (!documentation && StartsWith(name, "--") && globals.given.count(name) != 0) {
+        error = "option " + Quoted(name) + " given more than once";
+    }
     if (word == "--help" || word == "-h") {
         globals.help = true;
     } else if (word == "--list-commands") {
@@ -242,20 +261,25 @@ bool TakeGlobalOption(const std::vector<std::string>& words, size_t& index, Glob
         globals.noHeader = true;
     } else {
         std::string value;
-        if (MatchValueOption(words, index, "--formatter", value, error)) {
+        std::string valueError;
+        if (MatchValueOption(words, index, "--formatter", value, valueError)) {
             globals.formatter = value;
-            return true;
-        }
-        if (MatchValueOption(words, index, "--fields", value, error)) {
+        } else if (MatchValueOption(words, index, "--fields", value, valueError)) {
             globals.fieldsGiven = true;
             globals.fields = SplitNames(value);
-            if (error.empty() && globals.fields.empty()) {
-                error = "option '--fields' needs at least one field name";
+            if (valueError.empty() && globals.fields.empty()) {
+                valueError = "option '--fields' needs at least one field name";
             }
-            return true;
+        } else {
+            return false;
         }
-        return false;
+        if (error.empty()) {
+            error = valueError;
+        }
+        globals.given.insert(name);
+        return true;
     }
+    globals.given.insert(name);
     index += 1;
     return true;
 }
@@ -310,7 +334,14 @@ ParseResult ParseArguments(const std::vector<std::string>& words, const InputSpe
             }
             std::string option =
                 StartsWith(word, "--") ? word.substr(0, word.find('=')) : word.substr(0, 2);
-            fail("unknown option " + Quoted(option));
+            std::vector<std::string> known = GlobalOptionNames();
+            for (const auto& candidate : spec.GetParameters()) {
+                if (candidate) {
+                    known.push_back("--" + candidate->GetName());
+                }
+            }
+            fail("unknown option " + Quoted(option) +
+                 (StartsWith(option, "--") ? DidYouMean(option, known) : std::string()));
             continue;
         }
 
@@ -341,14 +372,23 @@ ParseResult ParseArguments(const std::vector<std::string>& words, const InputSpe
         }
     }
 
+    std::vector<std::string> missing;
     for (const auto& parameter : spec.GetParameters()) {
         if (parameter && parameter->IsRequired() && !seen.count(parameter->GetName())) {
-            fail("missing required option " + Quoted("--" + parameter->GetName()));
+            missing.push_back(Quoted("--" + parameter->GetName()));
         }
     }
+    if (missing.size() == 1) {
+        fail("missing required option " + missing[0]);
+    } else if (!missing.empty()) {
+        fail("missing required options " + Join(missing, ", "));
+    }
 
-    if (globals && globals->help) {
-        result.helpRequested = true;
+    // A request for documentation describes the command; it does not run it, so the
+    // arguments around it are not checked.
+    if (globals && (globals->help || globals->listCommands || globals->reference)) {
+        result.helpRequested = globals->help;
+        result.documentationRequested = true;
     } else {
         result.error = firstError;
     }

@@ -2,6 +2,7 @@
 #pragma once
 
 #include <memory>
+#include <set>
 #include <string>
 #include <vector>
 
@@ -22,7 +23,11 @@ struct GlobalOptions {
     std::string formatter;      // --formatter NAME; empty: the command's default
     bool fieldsGiven = false;   // --fields A,B
     std::vector<std::string> fields;
+    std::set<std::string> given;  // the long names of the options above that were given
 };
+
+// The long names of the global options, for suggestions.
+std::vector<std::string> GlobalOptionNames();
 
 // Tries words[index] as a global option. Returns false when it is none. Otherwise stores it
 // in `globals`, moves `index` past the option and its value, and returns true; a missing
@@ -37,12 +42,15 @@ struct ParseResult {
     std::string error;
     // --help or -h was among the words: help wins over any error.
     bool helpRequested = false;
+    // --help, -h, --list-commands or --reference was among the words: `error` stays empty.
+    bool documentationRequested = false;
 };
 
 // Parses a command's options against its input specification: `--name value`,
 // `--name=value`, `-x value` and `-xvalue`; flags without value; booleans as true, false, 1
 // or 0; decimal 64-bit integers; list options repeated; required parameters, enumerations
-// and integer ranges (both bounds allowed) checked. Any other option repeated, an unknown
+// and integer ranges (both bounds allowed) checked; every missing required option named in one
+// message. Any other option repeated, an unknown
 // option, a stray word and a text value with a control character other than tab are errors.
 // With `globals` set, global options that the command does not shadow are taken into it.
 // Does no I/O.

@@ -63,8 +63,8 @@ std::string CheckFields(CommandSpec& command, const std::vector<std::string>& fi
     }
     for (const auto& name : fields) {
         if (std::find(known.begin(), known.end(), name) == known.end()) {
-            return "unknown field '" + MessageText(name) +
-                   "' for --fields; valid choices: " + Join(known, ", ");
+            return "unknown field '" + MessageText(name) + "' for --fields" +
+                   DidYouMean(name, known) + "; valid choices: " + Join(known, ", ");
         }
     }
     return std::string();
@@ -81,9 +81,6 @@ RunResult RunCommand(CommandSpec& command, const std::vector<std::string>& words
         result.out = RenderCommandHelp(command, *inputSpec);
         return result;
     }
-    if (!parsed.error.empty()) {
-        return UsageError(result, &command, parsed.error);
-    }
     if (globals.listCommands) {
         result.out = ListCommands(command);
         return result;
@@ -91,6 +88,9 @@ RunResult RunCommand(CommandSpec& command, const std::vector<std::string>& words
     if (globals.reference) {
         result.out = RenderReference(command.GetThis());
         return result;
+    }
+    if (!parsed.error.empty()) {
+        return UsageError(result, &command, parsed.error);
     }
 
     std::string formatterName = globals.formatter;
@@ -103,8 +103,9 @@ RunResult RunCommand(CommandSpec& command, const std::vector<std::string>& words
     FormatterFunction formatter = FindFormatter(formatterName);
     if (!formatter) {
         return UsageError(result, nullptr,
-                          "unknown formatter '" + MessageText(formatterName) +
-                              "'; valid choices: " + Join(FormatterNames(), ", "));
+                          "unknown formatter '" + MessageText(formatterName) + "'" +
+                              DidYouMean(formatterName, FormatterNames()) +
+                              "; valid choices: " + Join(FormatterNames(), ", "));
     }
     if (globals.fieldsGiven) {
         std::string error = CheckFields(command, globals.fields);
@@ -181,8 +182,10 @@ RunResult Run(const std::vector<std::string>& words, const std::shared_ptr<Names
         while (index < words.size() && !words[index].empty() && words[index][0] == '-') {
             std::string error;
             if (!TakeGlobalOption(words, index, globals, error)) {
+                const std::string option = words[index].substr(0, words[index].find('='));
                 return UsageError(result, node.get(),
-                                  "unknown option '" + MessageText(words[index]) + "'");
+                                  "unknown option '" + MessageText(option) + "'" +
+                                      DidYouMean(option, GlobalOptionNames()));
             }
             if (!error.empty()) {
                 return UsageError(result, node.get(), error);

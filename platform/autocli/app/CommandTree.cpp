@@ -37,6 +37,7 @@ PathResolution ResolvePath(const std::shared_ptr<NamespaceNode>& root,
             const auto choices = resolution.node->GetNamespaceNodeNames();
             resolution.error = "'" + MessageText(word) + "' is not a namespace or command" +
                                (where.empty() ? std::string() : " in '" + where + "'") +
+                               DidYouMean(word, choices) +
                                (choices.empty() ? "; no commands are registered"
                                                 : "; valid choices: " + Join(choices, ", "));
             return resolution;

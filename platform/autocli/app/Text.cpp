@@ -1,6 +1,8 @@
 // Small text helpers shared by the parser, the help and the formatters.
 #include "Text.h"
 
+#include <algorithm>
+
 namespace Kalmor {
 namespace AutoCli {
 namespace App {
@@ -92,6 +94,54 @@ std::string Join(const std::vector<std::string>& items, const std::string& separ
         joined += items[i];
     }
     return joined;
+}
+
+namespace {
+
+std::string Lower(const std::string& text) {
+    std::string lower = text;
+    for (char& c : lower) {
+        c = static_cast<char>(c >= 'A' && c <= 'Z' ? c - 'A' + 'a' : c);
+    }
+    return lower;
+}
+
+// Edit distance with swaps of neighbours (optimal string alignment).
+size_t EditDistance(const std::string& a, const std::string& b) {
+    std::vector<std::vector<size_t>> d(a.size() + 1, std::vector<size_t>(b.size() + 1));
+    for (size_t i = 0; i <= a.size(); ++i) d[i][0] = i;
+    for (size_t j = 0; j <= b.size(); ++j) d[0][j] = j;
+    for (size_t i = 1; i <= a.size(); ++i) {
+        for (size_t j = 1; j <= b.size(); ++j) {
+            size_t cost = a[i - 1] == b[j - 1] ? 0 : 1;
+            d[i][j] = std::min({d[i - 1][j] + 1, d[i][j - 1] + 1, d[i - 1][j - 1] + cost});
+            if (i > 1 && j > 1 && a[i - 1] == b[j - 2] && a[i - 2] == b[j - 1]) {
+                d[i][j] = std::min(d[i][j], d[i - 2][j - 2] + 1);
+            }
+        }
+    }
+    return d[a.size()][b.size()];
+}
+
+}  // namespace
+
+std::string DidYouMean(const std::string& word, const std::vector<std::string>& choices) {
+    // Words of a command line are short; a long one is no typo of a name.
+    if (word.empty() || word.size() > 64) {
+        return std::string();
+    }
+    const std::string lower = Lower(word);
+    const size_t allowed = lower.size() <= 4 ? 1 : 2;
+    const std::string* best = nullptr;
+    size_t bestDistance = allowed + 1;
+    for (const auto& choice : choices) {
+        size_t distance = EditDistance(lower, Lower(choice));
+        if (distance < bestDistance) {
+            best = &choice;
+            bestDistance = distance;
+        }
+    }
+    return best ? " (did you mean '" + *best + "'?)" : std::string();
 }
 
 size_t DisplayWidth(const std::string& text) {

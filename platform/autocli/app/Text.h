@@ -17,6 +17,11 @@ std::vector<std::string> SplitNames(const std::string& text);
 
 std::string Join(const std::vector<std::string>& items, const std::string& separator);
 
+// " (did you mean 'NAME'?)" for the choice closest to a mistyped word: one that differs only
+// in case, or by at most one edit in a short word and two in a longer one (an edit inserts,
+// deletes, replaces or swaps neighbouring letters); "" when no choice is that close.
+std::string DidYouMean(const std::string& word, const std::vector<std::string>& choices);
+
 // The number of characters of a UTF-8 text as a terminal shows them (one per code point;
 // bytes that are not valid UTF-8 count one each).
 size_t DisplayWidth(const std::string& text);

@@ -46,6 +46,7 @@ TEST(ArgumentParser, RefusesBadInputWithOneMessage) {
     const std::vector<std::pair<std::vector<std::string>, std::string>> cases = {
         {{"-w"}, "missing required option '--name'"},
         {{"-n", "a", "--bogus=1"}, "unknown option '--bogus'"},
+        {{"-n", "a", "--lod", "1"}, "unknown option '--lod' (did you mean '--loud'?)"},
         {{"-n", "a", "stray"}, "unexpected argument 'stray'"},
         {{"--name", "--wave"}, "option '--name' needs a value"},
         {{"-n", "a", "-c", " 5"}, "option '--count' needs a decimal integer (got ' 5')"},
@@ -88,8 +89,29 @@ TEST(ArgumentParser, TakesGlobalOptionsAfterTheCommandUnlessItHasOptionsOfThoseN
     EXPECT_TRUE(globals.noHeader && globals.debug);
     EXPECT_FALSE(globals.fieldsGiven);
     EXPECT_EQ(Values(*result.input), "fields=a,b;host=x");
-    EXPECT_EQ(ParseArguments({"--formatter"}, *spec, &globals).error,
+    GlobalOptions fresh;
+    EXPECT_EQ(ParseArguments({"--formatter"}, *spec, &fresh).error,
               "option '--formatter' needs a value");
+    EXPECT_EQ(ParseArguments({"--debug", "--debug"}, *spec, &fresh).error,
+              "option '--debug' given more than once");
+}
+
+// A request for documentation describes the command without checking the words around it, and
+// a help flag where a value belongs is a request for help, not a value.
+TEST(ArgumentParser, DocumentationRequestsSkipValidation) {
+    auto spec = EveryKind();
+    for (const std::vector<std::string>& words : std::vector<std::vector<std::string>>{
+             {"--reference"}, {"--list-commands", "-c", "x"}, {"-n", "-h"}, {"-c", "--help"}}) {
+        GlobalOptions globals;
+        ParseResult result = ParseArguments(words, *spec, &globals);
+        EXPECT_EQ(result.error, "") << ::testing::PrintToString(words);
+        EXPECT_TRUE(result.documentationRequested) << ::testing::PrintToString(words);
+    }
+    // Every missing required option is named at once.
+    auto two = InputSpec::New();
+    two->AddParameter(Param("ssd", PARAM_STRING, "", true));
+    two->AddParameter(Param("disks", PARAM_STRING_LIST, "", true));
+    EXPECT_EQ(ParseArguments({}, *two).error, "missing required options '--ssd', '--disks'");
 }
 
 TEST(ArgumentParser, RefusesDeclarationsItCannotCheck) {
