@@ -48,7 +48,7 @@ _capture bash -c "$FIRST"
 expect_err "Mesk Clustering is not enabled on this host"
 
 case_ "an install with something unbuilt copies nothing"
-rm build/platform/autocli/completions/autocli
+rm build/platform/autocli/completions/bash/autocli
 _capture cmake --install build --prefix "$E2E_DIR/partial"
 expect_eq "$RC" 1 "exit status of cmake --install"
 expect_err_has "run scripts/ensure-built first"
@@ -67,6 +67,7 @@ done
 
 case_ "the install holds what README says, and runs from there"
 for path in bin/autocli bin/hostsim share/bash-completion/completions/autocli \
+    share/zsh/vendor-completions/_autocli share/fish/vendor_completions.d/autocli.fish \
     share/man/man1/autocli-mesk.1.gz; do
     expect_eq "$([ -e "$E2E_DIR/opt/mesk/$path" ] && echo present)" present "$path"
 done

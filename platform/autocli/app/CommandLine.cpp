@@ -157,10 +157,13 @@ bool RunBuiltin(const std::vector<std::string>& words, const std::shared_ptr<Nam
     if (words[0] != "completion" || root->HasNamespaceNode("completion")) {
         return false;
     }
-    if (words.size() == 2 && words[1] == "bash") {
-        result.out = BashCompletionScript();
+    const std::string script = words.size() == 2 ? CompletionScript(words[1]) : std::string();
+    if (!script.empty()) {
+        result.out = script;
     } else {
-        result.err = "autocli: completion: name the shell; valid choices: bash\n";
+        std::vector<std::string> shells(std::begin(kCompletionShells), std::end(kCompletionShells));
+        result.err =
+            "autocli: completion: name the shell; valid choices: " + Join(shells, ", ") + "\n";
         result.status = kExitUsage;
     }
     return true;

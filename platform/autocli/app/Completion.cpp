@@ -65,6 +65,37 @@ const ParameterSpec* FindParameter(const InputSpec& spec, const std::string& wor
     return nullptr;
 }
 
+// Whether a text option names a file or directory, judged by its name: the framework knows no
+// more about a value than its kind, and only then may the shell offer file names.
+bool NamesAPath(const ParameterSpec& parameter) {
+    const std::string& name = parameter.GetName();
+    for (const char* word : {"path", "file", "dir"}) {
+        if (name.find(word) != std::string::npos) {
+            return true;
+        }
+    }
+    return false;
+}
+
+// The field names of the command's result, as --fields takes them.
+std::vector<std::string> FieldNames(CommandSpec* command) {
+    std::vector<std::string> names;
+    if (command == nullptr) {
+        return names;
+    }
+    const auto outputSpec = command->GetOutputSpec();
+    std::shared_ptr<MetaObj::MetaObject> root = outputSpec ? outputSpec->GetRootObject() : nullptr;
+    if (root && root->GetType() == MetaObj::META_LIST) {
+        root = static_cast<const MetaObj::MetaList*>(root.get())->GetTemplate();
+    }
+    if (root && root->GetType() == MetaObj::META_STRUCT) {
+        for (const auto& field : static_cast<const MetaObj::MetaStruct*>(root.get())->GetFields()) {
+            names.push_back(field.name);
+        }
+    }
+    return names;
+}
+
 // What the last complete word left waiting for a value.
 struct Awaited {
     const ParameterSpec* parameter = nullptr;
@@ -77,6 +108,9 @@ class Completer {
     Completer(const std::string& current, Completion& result)
         : current_(current), result_(result) {}
 
+    // The command whose options are being completed, for the names --fields takes.
+    void SetCommand(CommandSpec* command) { command_ = command; }
+
     void Offer(const std::string& candidate) {
         if (StartsWith(candidate, current_)) {
             result_.candidates.push_back(candidate);
@@ -86,10 +120,13 @@ class Completer {
     // Values of an option; `prefix` is "--name=" when the value is typed in the same word.
     void OfferValues(const Awaited& awaited, const std::string& prefix) {
         if (awaited.global != nullptr) {
-            if (std::string(awaited.global->name) == "--formatter") {
-                for (const auto& name : FormatterNames()) {
-                    Offer(prefix + name);
+            const std::string name = awaited.global->name;
+            if (name == "--formatter") {
+                for (const auto& formatter : FormatterNames()) {
+                    Offer(prefix + formatter);
                 }
+            } else if (name == "--fields") {
+                OfferFields(prefix);
             }
             return;
         }
@@ -108,7 +145,7 @@ class Completer {
         }
         const bool freeText = parameter.GetType() == CallSpec::PARAM_STRING ||
                               parameter.GetType() == CallSpec::PARAM_STRING_LIST;
-        if (freeText && prefix.empty()) {
+        if (freeText && prefix.empty() && NamesAPath(parameter)) {
             result_.directive &= ~kCompleteNoFileNames;
         }
     }
@@ -150,6 +187,20 @@ class Completer {
         }
     }
 
+    // --fields takes names separated by commas: the names typed so far stay in front, and
+    // those already chosen are not offered again.
+    void OfferFields(const std::string& prefix) {
+        const std::string typed = current_.substr(std::min(prefix.size(), current_.size()));
+        const size_t comma = typed.rfind(',');
+        const std::string chosen = comma == std::string::npos ? "" : typed.substr(0, comma + 1);
+        const std::string chosenList = "," + chosen;
+        for (const auto& name : FieldNames(command_)) {
+            if (chosenList.find("," + name + ",") == std::string::npos) {
+                Offer(prefix + chosen + name);
+            }
+        }
+    }
+
     void OfferGlobalOptions() {
         for (const auto& option : kGlobalOptions) {
             Offer(option.name);
@@ -159,6 +210,7 @@ class Completer {
   private:
     const std::string& current_;
     Completion& result_;
+    CommandSpec* command_ = nullptr;
 };
 
 Completion CompleteWords(const std::vector<std::string>& words,
@@ -171,7 +223,9 @@ Completion CompleteWords(const std::vector<std::string>& words,
     // `autocli completion bash`, unless a plug-in took the word.
     if (complete >= 1 && words[0] == "completion" && !root->HasNamespaceNode("completion")) {
         if (complete == 1) {
-            completer.Offer("bash");
+            for (const char* shell : kCompletionShells) {
+                completer.Offer(shell);
+            }
         }
         return result;
     }
@@ -217,6 +271,7 @@ Completion CompleteWords(const std::vector<std::string>& words,
         node = child;
         if (node->GetType() == NodeType::Command) {
             auto* command = dynamic_cast<CommandSpec*>(node.get());
+            completer.SetCommand(command);
             spec = command ? command->GetInputSpec() : nullptr;
             if (!spec) {
                 spec = InputSpec::New();
@@ -280,9 +335,10 @@ std::string RenderCompletion(const Completion& completion) {
     return text + ":" + std::to_string(completion.directive) + "\n";
 }
 
-const std::string& BashCompletionScript() {
-    static const std::string script =
-        R"BASH(# bash completion for autocli. The candidates come from autocli itself (`autocli __complete`),
+namespace {
+
+const char kBashScript[] =
+    R"BASH(# bash completion for autocli. The candidates come from autocli itself (`autocli __complete`),
 # so the commands of every installed plug-in complete without regenerating this file.
 
 # Without bash-completion's helpers, bash splits "--formatter=js" at "=" into three words;
@@ -318,8 +374,10 @@ _autocli() {
         _autocli_words
     fi
     COMPREPLY=()
+    # Field names hold blanks: autocli sees the word as it will be read, without the escapes.
+    local typed=${cur//\\ / }
     local answer line lines=()
-    answer=$("${words[0]}" __complete "${words[@]:1:cword-1}" "$cur" 2>/dev/null) || return 0
+    answer=$("${words[0]}" __complete "${words[@]:1:cword-1}" "$typed" 2>/dev/null) || return 0
     while IFS= read -r line; do
         lines+=("$line")
     done <<<"$answer"
@@ -331,7 +389,7 @@ _autocli() {
     if [[ $cur == *=* && $COMP_WORDBREAKS == *=* ]]; then
         lines=("${lines[@]#"${cur%%=*}="}")
     fi
-    COMPREPLY=("${lines[@]}")
+    COMPREPLY=("${lines[@]//\ /\\ }")
     if ((directive & 2)); then
         compopt -o nospace 2>/dev/null
     fi
@@ -343,7 +401,63 @@ _autocli() {
 
 complete -o default -F _autocli autocli
 )BASH";
-    return script;
+
+const char kZshScript[] =
+    R"ZSH(#compdef autocli
+# zsh completion for autocli: the candidates come from `autocli __complete`, as for bash.
+_autocli() {
+    local -a lines
+    local directive
+    lines=("${(@f)$("${words[1]}" __complete "${(@Q)words[2,CURRENT]}" 2>/dev/null)}")
+    [[ ${lines[-1]} == :<-> ]] || return 1
+    directive=${lines[-1]#:}
+    lines=("${(@)lines[1,-2]}")
+    (( directive & 1 )) && return 1
+    if (( ${#lines} )); then
+        if (( directive & 2 )); then
+            compadd -S '' -- "${lines[@]}"
+        else
+            compadd -- "${lines[@]}"
+        fi
+    elif (( ! (directive & 4) )); then
+        _files
+    fi
+}
+if (( $+functions[compdef] )); then
+    compdef _autocli autocli
+fi
+)ZSH";
+
+const char kFishScript[] =
+    R"FISH(# fish completion for autocli: the candidates come from `autocli __complete`, as for bash.
+function __autocli_complete
+    set -l words (commandline -opc)
+    set -l current (commandline -ct)
+    set -l answer ($words[1] __complete $words[2..-1] "$current" 2>/dev/null)
+    or return
+    string match -qr '^:[0-9]+$' -- $answer[-1]
+    or return
+    set -l directive (string sub -s 2 -- $answer[-1])
+    set -e answer[-1]
+    if test (math "$directive % 2") -eq 1
+        return
+    end
+    if test (count $answer) -gt 0
+        printf '%s\n' $answer
+    else if test (math "floor($directive / 4) % 2") -eq 0
+        __fish_complete_path "$current"
+    end
+end
+complete -c autocli -f -a '(__autocli_complete)'
+)FISH";
+
+}  // namespace
+
+std::string CompletionScript(const std::string& shell) {
+    if (shell == "bash") return kBashScript;
+    if (shell == "zsh") return kZshScript;
+    if (shell == "fish") return kFishScript;
+    return std::string();
 }
 
 }  // namespace App

@@ -31,17 +31,23 @@ struct Completion {
 // The candidates for the last of `words`: child names in a namespace; option names (long,
 // and short after a lone "-") in a command, those already given left out unless they may be
 // repeated; the values of an enumeration, true and false for a boolean, the formatter names
-// for --formatter. A text value without enumeration may be a path, so the shell may fall back
-// to file names there. A word that names no child sets kCompleteError. Never throws.
+// for --formatter, the result's field names for --fields (after the names already typed, comma
+// separated). A text value without enumeration falls back to file names only when the
+// option's name says it is a path, file or directory. A word that names no child sets
+// kCompleteError. Never throws.
 Completion Complete(const std::vector<std::string>& words,
                     const std::shared_ptr<NamespaceNode>& root);
 
 // The candidates one per line, then ":<directive>".
 std::string RenderCompletion(const Completion& completion);
 
-// The bash adaptor printed by `autocli completion bash`: it hands the words of the command
-// line to `<the typed program> __complete` and fills COMPREPLY from the answer.
-const std::string& BashCompletionScript();
+// The shells that `autocli completion SHELL` prints an adaptor for.
+constexpr const char* kCompletionShells[] = {"bash", "zsh", "fish"};
+
+// The adaptor printed by `autocli completion SHELL`, "" for a shell not in kCompletionShells:
+// it hands the words of the command line to `<the typed program> __complete` and offers the
+// answer's candidates, falling back to file names only when the directive allows it.
+std::string CompletionScript(const std::string& shell);
 
 }  // namespace App
 }  // namespace AutoCli

@@ -128,7 +128,8 @@ std::string RenderNamespaceHelp(const NamespaceNode& node) {
             "\nThe options other than --help and --list-commands may also follow a command\n"
             "that has no option of the same name. Set AUTOCLI_PLUGIN_PATH (directories\n"
             "separated by colons) to load plug-ins from other directories.\n"
-            "`autocli completion bash` prints the script that completes commands in bash.\n";
+            "`autocli completion bash|zsh|fish` prints the script that completes commands in\n"
+            "that shell.\n";
     }
     return text;
 }

@@ -37,7 +37,8 @@ std::shared_ptr<Namespace> Tree() {
     return root;
 }
 
-// Directives: 4 no file names, 1 nothing to offer (an error), 0 file names welcome.
+// Directives: 4 no file names, 1 nothing to offer (an error), 0 file names welcome (only for an
+// option whose name says it is a path).
 TEST(Completion, CandidatesAndDirectiveAtEachLevel) {
     const std::string globals = "--formatter --fields --no-header --debug --help";
     const std::string hello = "mesk other hello ";
@@ -61,18 +62,18 @@ TEST(Completion, CandidatesAndDirectiveAtEachLevel) {
         {hello + "-n bob --wave -i a -",
          "--count --big --loud --item --role " + globals + " -c -l -i -r -h", 4},
         {hello + "--name=bob --n", "--no-header", 4},
-        // Values: enumerations, booleans, none for integers, files possible for free text.
+        // Values: enumerations, booleans, none for integers or free text that is no path.
         {hello + "--role ", "witness node", 4},
         {hello + "--role=w", "--role=witness", 4},
         {hello + "-l ", "true false", 4},
         {hello + "--count ", "", 4},
-        {hello + "--name ", "", 0},
+        {hello + "--name ", "", 4},
         // A value already taken leaves the next word to options again.
         {hello + "--role node --r", "", 4},
         // A command's own --fields and -h hide autocli's.
         {"mesk shadow -", "--fields --formatter --no-header --debug --help -h", 4},
         {"mesk broken -", "", 1},
-        {"completion ", "bash", 4},
+        {"completion ", "bash zsh fish", 4},
     };
     auto root = Tree();
     for (const auto& entry : cases) {
@@ -87,9 +88,9 @@ TEST(Completion, CandidatesAndDirectiveAtEachLevel) {
 }
 
 TEST(Completion, BuiltinWordsOfTheCommandLine) {
-    App::RunResult result = App::Run({"completion", "zsh"}, Tree());
+    App::RunResult result = App::Run({"completion", "tcsh"}, Tree());
     EXPECT_EQ(result.status, 2);
-    EXPECT_EQ(result.err, "autocli: completion: name the shell; valid choices: bash\n");
+    EXPECT_EQ(result.err, "autocli: completion: name the shell; valid choices: bash, zsh, fish\n");
 
     // A plug-in that registers "completion" at the root keeps it.
     auto command = TestCommand::New("Mine.", [](Input&, Output& out) {

@@ -1,0 +1,44 @@
+#!/bin/bash
+# Completion as a person meets it: each shell's adaptor (`autocli completion SHELL`) loaded in
+# a real interactive shell on a pseudo-terminal, a line typed and Tab pressed. bash always;
+# zsh and fish where they are installed.
+. "$(dirname "$0")/lib.sh"
+
+BIN="$E2E_DIR/bin"
+mkdir -p "$BIN" "$E2E_DIR/cwd"
+ln -s "$AUTOCLI" "$BIN/autocli"
+touch "$E2E_DIR/cwd/zzfile"
+cd "$E2E_DIR/cwd"
+
+# The typed line | what the line must read after Tab ("!" before it: must not read)
+CASES='autocli mesk sto|autocli mesk storage
+autocli mesk storage list --formatter x|--formatter xml
+autocli mesk storage list --fields Dev|--fields Device
+autocli mesk storage list --fields Device,Disp|--fields Device,Display\ Name
+autocli mesk storage list -d zz|!zzfile
+autocli mesk trace set -p zz|-p zzfile'
+
+for shell in bash zsh fish; do
+    if ! command -v "$shell" >/dev/null; then
+        echo "skipped: $shell is not installed" >&2
+        continue
+    fi
+    ok completion "$shell"
+    printf '%s\n' "$OUT" >"$E2E_DIR/completion.$shell"
+    lines=()
+    while IFS='|' read -r line expected; do lines+=("$line"); done <<<"$CASES"
+    _capture env PATH="$BIN:$PATH" timeout 120 python3 "$MESK_SOURCE_DIR/tests/e2e/type_in_shell.py" \
+        "$shell" "source $E2E_DIR/completion.$shell" "${lines[@]}"
+    SHOWN=$OUT
+    while IFS='|' read -r line expected; do
+        case_ "$shell: $line"
+        OUT=$(grep -F "$line"$'\t' <<<"$SHOWN" | cut -f2-)
+        if [[ $expected == !* ]]; then
+            expect_out_lacks "${expected#!}"
+        else
+            expect_out_has "$expected"
+        fi
+    done <<<"$CASES"
+done
+
+finish
