@@ -1,7 +1,7 @@
 #!/bin/bash
 # Completion as a person meets it: each shell's adaptor (`autocli completion SHELL`) loaded in
 # a real interactive shell on a pseudo-terminal, a line typed and Tab pressed. bash always;
-# zsh and fish where they are installed.
+# zsh and fish where they are installed. Help is wrapped to a terminal's width, and only there.
 . "$(dirname "$0")/lib.sh"
 
 BIN="$E2E_DIR/bin"
@@ -40,5 +40,12 @@ for shell in bash zsh fish; do
         fi
     done <<<"$CASES"
 done
+
+case_ "help is wrapped to the terminal's width, and whole in a pipe"
+_capture script -qec "stty cols 80; $AUTOCLI mesk policy setdefault --help" /dev/null
+expect_rc 0
+expect_eq "$(tr -d '\r' <<<"$OUT" | awk 'length > 79' | head -3)" "" "lines wider than the terminal"
+run mesk policy setdefault --help
+expect_eq "$(awk 'length > 300 { print "long" }' <<<"$OUT" | head -1)" long "a help line left whole"
 
 finish

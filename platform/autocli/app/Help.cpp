@@ -1,7 +1,11 @@
 // Help texts of namespaces and commands.
 #include "Help.h"
 
+#include <sys/ioctl.h>
+#include <unistd.h>
+
 #include <algorithm>
+#include <cstdlib>
 #include <vector>
 
 #include "Formatter.h"
@@ -20,15 +24,67 @@ struct Row {
     std::string right;
 };
 
+// The width to wrap help to: the terminal's, when stdout is one; 0 (no wrapping) otherwise, so
+// that scripts and tests read every text whole.
+size_t WrapWidth() {
+    static const size_t width = [] {
+        if (!isatty(STDOUT_FILENO)) {
+            return size_t{0};
+        }
+        winsize size{};
+        if (ioctl(STDOUT_FILENO, TIOCGWINSZ, &size) == 0 && size.ws_col > 0) {
+            return static_cast<size_t>(size.ws_col);
+        }
+        const char* columns = std::getenv("COLUMNS");
+        const long parsed = columns ? std::strtol(columns, nullptr, 10) : 0;
+        return parsed > 0 ? static_cast<size_t>(parsed) : size_t{80};
+    }();
+    return width;
+}
+
+// Breaks each line of `text` at blanks so that, after `indent` columns, none is wider than
+// `width`; a word longer than the room is left whole. Lines after the first are indented.
+std::string Wrap(const std::string& text, size_t indent, size_t width) {
+    const size_t room = width > indent + 20 ? width - indent - 1 : 20;
+    const std::string margin(indent, ' ');
+    std::string wrapped;
+    size_t start = 0;
+    while (start <= text.size()) {
+        size_t end = text.find('\n', start);
+        std::string line = text.substr(start, end == std::string::npos ? end : end - start);
+        while (DisplayWidth(line) > room) {
+            size_t cut = line.rfind(' ', room);
+            if (cut == std::string::npos || cut == 0) {
+                cut = line.find(' ', room);
+                if (cut == std::string::npos) break;
+            }
+            wrapped += line.substr(0, line.find_last_not_of(' ', cut) + 1) + "\n" + margin;
+            line = line.substr(line.find_first_not_of(' ', cut) == std::string::npos
+                                   ? line.size()
+                                   : line.find_first_not_of(' ', cut));
+        }
+        if (end == std::string::npos) {
+            wrapped += line;
+            break;
+        }
+        wrapped += line.substr(0, line.find_last_not_of(' ') + 1);
+        wrapped += "\n" + margin;
+        start = end + 1;
+    }
+    return wrapped;
+}
+
 // Rows as two aligned columns, indented by two blanks.
 std::string RenderRows(const std::vector<Row>& rows) {
     size_t width = 0;
     for (const auto& row : rows) {
         width = std::max(width, DisplayWidth(row.left));
     }
+    const size_t wrapWidth = WrapWidth();
     std::string text;
     for (const auto& row : rows) {
-        std::string line = "  " + PadRight(row.left, width + 2) + row.right;
+        const std::string right = wrapWidth ? Wrap(row.right, width + 4, wrapWidth) : row.right;
+        std::string line = "  " + PadRight(row.left, width + 2) + right;
         text += line.substr(0, line.find_last_not_of(' ') + 1) + "\n";
     }
     return text;
@@ -58,7 +114,8 @@ std::string RangeText(int64_t minimum, int64_t maximum) {
 
 void AppendParagraph(std::string& text, const std::string& paragraph) {
     if (!paragraph.empty()) {
-        text += "\n" + paragraph + "\n";
+        const size_t wrapWidth = WrapWidth();
+        text += "\n" + (wrapWidth ? Wrap(paragraph, 0, wrapWidth) : paragraph) + "\n";
     }
 }
 
