@@ -57,6 +57,21 @@ expect_rc 1
 expect_out ""
 expect_err "autocli: mesk other hello: the command failed: hello refused to greet 'throw'"
 
+case_ "an exception from a plug-in's tree or specs, wherever autocli reaches them"
+while read -r status words; do
+    # shellcheck disable=SC2086
+    OTHER_PLUGIN_THROW=1 run $words
+    expect_rc "$status"
+    if [ "$status" -eq 0 ]; then expect_err ""; else expect_err_has "failed: broken "; fi
+done <<'ROWS'
+1 --reference
+1 mesk other --help
+1 mesk --list-commands
+1 mesk other hello -n bob
+1 mesk other hello --reference
+0 __complete mesk other hello --
+ROWS
+
 case_ "unusable libraries in a plug-in directory are reported and skipped"
 BROKEN="$E2E_DIR/plugins"
 mkdir -p "$BROKEN"

@@ -4,7 +4,9 @@
 //
 // The command greets --name and returns the "OtherHello" structure. Two names change what it
 // does: "fail" adds an error message (the result is still set, the output not completed), and
-// "throw" throws std::runtime_error out of the command.
+// "throw" throws std::runtime_error out of the command. With OTHER_PLUGIN_THROW set, the
+// command's specs and the listing of `mesk other` throw too, as a broken plug-in's tree would.
+#include <cstdlib>
 #include <memory>
 #include <stdexcept>
 #include <string>
@@ -30,6 +32,18 @@ using Kalmor::MetaObj::MetaList;
 using Kalmor::MetaObj::MetaString;
 using Kalmor::MetaObj::MetaStruct;
 
+void ThrowIfAsked(const char* what) {
+    if (std::getenv("OTHER_PLUGIN_THROW")) throw std::runtime_error(std::string("broken ") + what);
+}
+
+class OtherNamespace : public Namespace {
+  public:
+    std::vector<std::shared_ptr<NamespaceNode>> GetNamespaceNodes() const override {
+        ThrowIfAsked("namespace");
+        return Namespace::GetNamespaceNodes();
+    }
+};
+
 class OtherHello : public virtual Command {
   public:
     OtherHello() {
@@ -42,6 +56,7 @@ class OtherHello : public virtual Command {
     }
 
     std::shared_ptr<InputSpec> GetInputSpecInternal() override {
+        ThrowIfAsked("spec");
         auto spec = InputSpec::New();
         auto add = [&spec](const char* name, Kalmor::CallSpec::ParameterType type,
                            const char* shortName, const char* description) {
@@ -126,7 +141,7 @@ AUTOCLI_PLUGIN_ENTRY void AutoCli_RegisterNamespaces(std::shared_ptr<NamespaceNo
     } else if (mesk->GetType() != NodeType::Namespace) {
         throw std::logic_error("'mesk' on the root is not a namespace");
     }
-    auto other = Namespace::New();
+    auto other = std::make_shared<OtherNamespace>();
     other->SetDescription("Commands of the second test plug-in");
     other->RegisterNamespaceNode(std::make_shared<OtherHello>(), "hello");
     mesk->RegisterNamespaceNode(other, "other");

@@ -169,15 +169,15 @@ bool RunBuiltin(const std::vector<std::string>& words, const std::shared_ptr<Nam
     return true;
 }
 
-}  // namespace
-
-RunResult Run(const std::vector<std::string>& words, const std::shared_ptr<NamespaceNode>& root) {
+// Run() without its boundary; `node` follows the path as it is resolved.
+RunResult Dispatch(const std::vector<std::string>& words,
+                   const std::shared_ptr<NamespaceNode>& root,
+                   std::shared_ptr<NamespaceNode>& node) {
     RunResult result;
     if (RunBuiltin(words, root, result)) {
         return result;
     }
     GlobalOptions globals;
-    std::shared_ptr<NamespaceNode> node = root;
     size_t index = 0;
     // Global options may stand before the path and between its words; the words after a
     // command are the command's.
@@ -215,15 +215,7 @@ RunResult Run(const std::vector<std::string>& words, const std::shared_ptr<Names
             result.status = kExitCommandFailed;
             return result;
         }
-        try {
-            return RunCommand(*command, words, index, globals);
-        } catch (const std::exception& e) {
-            result.err = Prefix(node.get()) + "the command failed: " + e.what() + "\n";
-        } catch (...) {
-            result.err = Prefix(node.get()) + "the command failed with an unknown exception\n";
-        }
-        result.status = kExitCommandFailed;
-        return result;
+        return RunCommand(*command, words, index, globals);
     }
 
     if (globals.help) {
@@ -247,6 +239,35 @@ RunResult Run(const std::vector<std::string>& words, const std::shared_ptr<Names
     return UsageError(
         result, node.get(),
         "missing command; valid choices: " + Join(node->GetNamespaceNodeNames(), ", "));
+}
+
+}  // namespace
+
+// Plug-ins' code runs not only in a command's execution but wherever the tree is rendered
+// (help, listings, the reference and completion build the commands' specs): whatever it
+// throws is caught here, once for all of them.
+RunResult Run(const std::vector<std::string>& words, const std::shared_ptr<NamespaceNode>& root) {
+    std::shared_ptr<NamespaceNode> node = root;
+    std::string what;
+    try {
+        return Dispatch(words, root, node);
+    } catch (const std::exception& e) {
+        what = std::string(": ") + e.what();
+    } catch (...) {
+        what = " with an unknown exception";
+    }
+    RunResult result;
+    if (!words.empty() && words[0] == kCompleteWord) {
+        Completion nothing;
+        nothing.directive = kCompleteError;
+        result.out = RenderCompletion(nothing);
+        return result;
+    }
+    const bool command = node->GetType() == NodeType::Command;
+    result.err =
+        Prefix(node.get()) + (command ? "the command failed" : "a plug-in failed") + what + "\n";
+    result.status = kExitCommandFailed;
+    return result;
 }
 
 }  // namespace App
