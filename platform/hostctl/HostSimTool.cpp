@@ -12,6 +12,7 @@
 
 #include "CallLog.h"
 #include "HostRoot.h"
+#include "Output.h"
 #include "SimHost.h"
 #include "StateDocument.h"
 #include "StateStore.h"
@@ -287,9 +288,7 @@ int Run(const std::string& command, const std::vector<std::string>& args) {
     throw UsageError("unknown command '" + command + "'");
 }
 
-}  // namespace
-
-int main(int argc, char** argv) {
+int Main(int argc, char** argv) {
     std::vector<std::string> args(argv + 1, argv + argc);
     if (args.empty()) {
         std::cerr << kUsage;
@@ -318,4 +317,11 @@ int main(int argc, char** argv) {
         std::cerr << "hostsim " << command << ": " << error.what() << "\n";
     }
     return 1;
+}
+
+}  // namespace
+
+int main(int argc, char** argv) {
+    std::cout.rdbuf(Output::StdoutBuffer());
+    return Output::Finish("hostsim", Main(argc, argv));
 }

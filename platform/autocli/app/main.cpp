@@ -1,26 +1,14 @@
 // autocli: loads the plug-ins, runs one command line and prints what it gave.
-#include <unistd.h>
-
 #include <cstdlib>
 #include <cstring>
 #include <string>
 #include <vector>
 
 #include "CommandLine.h"
+#include "Output.h"
 #include "PluginLoader.h"
 
 namespace {
-
-void WriteAll(int fd, const std::string& text) {
-    size_t written = 0;
-    while (written < text.size()) {
-        ssize_t n = write(fd, text.data() + written, text.size() - written);
-        if (n <= 0) {
-            return;
-        }
-        written += static_cast<size_t>(n);
-    }
-}
 
 // Where plug-ins are looked for when AUTOCLI_PLUGIN_PATH is unset: the installed plug-in
 // directory relative to this executable first, then the build's and the installed one.
@@ -48,7 +36,7 @@ int main(int argc, char** argv) {
         problems += "autocli: " + problem + "\n";
     }
     if (!completing) {
-        WriteAll(STDERR_FILENO, problems);
+        Output::Err(problems);
     }
 
     if (argc == 2 && std::strcmp(argv[1], "--version") == 0) {
@@ -58,12 +46,12 @@ int main(int argc, char** argv) {
             text +=
                 "plug-in " + (version.empty() ? "without a version" : version) + ": " + path + "\n";
         }
-        WriteAll(STDOUT_FILENO, text);
-        return 0;
+        Output::Out(text);
+        return Output::Finish("autocli", 0);
     }
 
     App::RunResult result = App::Run(std::vector<std::string>(argv + 1, argv + argc), root);
-    WriteAll(STDOUT_FILENO, result.out);
-    WriteAll(STDERR_FILENO, result.err);
-    return result.status;
+    Output::Out(result.out);
+    Output::Err(result.err);
+    return Output::Finish("autocli", result.status);
 }
