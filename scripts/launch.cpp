@@ -101,7 +101,6 @@ int main(int argc, char** argv) {
     std::string program;
     if (tool == "autocli") {
         program = build + "/platform/autocli/autocli";
-        Default("AUTOCLI_PLUGIN_PATH", build + "/plugins");
     } else if (tool == "hostsim") {
         program = build + "/platform/hostctl/hostsim";
     } else {

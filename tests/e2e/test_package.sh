@@ -43,6 +43,31 @@ for elf in usr/bin/autocli "$LIBDIR/mesk/libhostctl.so.0"; do
     expect_eq "$(readelf -S "$SYSROOT/$elf" | grep -c '\.debug_info')" 0 "debug information in $elf"
 done
 
+case_ "libraries are looked for only at absolute paths and \$ORIGIN, plug-ins only beside autocli"
+INSTALLED="$E2E_DIR/installed"
+cmake --install "$MESK_BUILD_DIR" --prefix "$INSTALLED" >/dev/null
+ELVES=0
+for file in $(ninja -C "$MESK_BUILD_DIR" -t targets all | sed -n "s|^\([^:]*\): .*|$MESK_BUILD_DIR/\1|p") \
+    $(find "$INSTALLED" "$SYSROOT/usr" -type f); do
+    case "$file" in *.o | *.a) continue ;; esac
+    [ -f "$file" ] && [ "$(head -c 4 "$file" | tr -d '\0')" = $'\x7fELF' ] || continue
+    ELVES=$((ELVES + 1))
+    # Each entry on a line of its own, the empty ones included.
+    BAD=$(readelf -d "$file" | sed -n 's/.*R[UN]*PATH.*\[\(.*\)\]$/\1:/p' | tr ':' '\n' | sed '$d' |
+        grep -v '^/\|^\$ORIGIN\(/\|$\)')
+    if [ -n "$BAD" ]; then _fail "$file searches '${BAD//$'\n'/"', '"}'"; fi
+done
+expect_eq "$([ "$ELVES" -ge 10 ] && echo many)" many "ELF files checked ($ELVES)"
+for program in "$AUTOCLI" "$INSTALLED/bin/autocli"; do
+    expect_eq "$(cd "$E2E_DIR" && env -u AUTOCLI_PLUGIN_PATH LD_DEBUG=libs "$program" mesk cluster get \
+        2>&1 >/dev/null | grep 'trying file=[^/]')" "" "relative library paths tried by $program"
+done
+strace -f -e trace=openat,open,stat,newfstatat -o "$E2E_DIR/trace" \
+    env -u AUTOCLI_PLUGIN_PATH "$INSTALLED/bin/autocli" mesk cluster get >/dev/null 2>&1
+expect_eq "$(grep -c "$MESK_BUILD_DIR" "$E2E_DIR/trace")" 0 "build-tree paths the installed autocli opens"
+expect_eq "$(grep -q "$INSTALLED/.*/autocli/plugins/libmesk.so\"" "$E2E_DIR/trace" && echo yes)" yes \
+    "the installed plug-in opened"
+
 # The installed programs use /var/lib/hostsim: in a mount namespace of their own, that is the
 # throwaway root's. Without the right to make one, the remaining cases are skipped.
 in_sysroot() {

@@ -10,12 +10,11 @@
 
 namespace {
 
-// Where plug-ins are looked for when AUTOCLI_PLUGIN_PATH is unset: the installed plug-in
-// directory relative to this executable first, then the build's and the installed one.
+// Where plug-ins are looked for when AUTOCLI_PLUGIN_PATH is unset: the plug-in directory
+// relative to this executable, wherever its tree lies, and no other.
 std::string DefaultPluginPath() {
     const std::string beside = Kalmor::AutoCli::App::ExecutableDirectory();
-    std::string path = AUTOCLI_DEFAULT_PLUGIN_PATH;
-    return beside.empty() ? path : beside + "/" + AUTOCLI_PLUGIN_DIR_FROM_EXECUTABLE + ":" + path;
+    return beside.empty() ? std::string() : beside + "/" + AUTOCLI_PLUGIN_DIR_FROM_EXECUTABLE;
 }
 
 }  // namespace
