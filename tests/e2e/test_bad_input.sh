@@ -288,18 +288,5 @@ for path in "${LISTED[@]}"; do
 done
 check_untouched
 
-# The one shell command line of the plug-in, the datastore notification of cluster leave, is
-# made of fixed texts only: not even a datastore name that the user set reaches it.
-case_ "cluster leave notifies with fixed texts only"
-populate
-run mesk datastore name set --newname "$SHELL_VALUE"
-expect_rc 0
-NOTIFY='"args":["-t","%s","-d","meskDatastore"]'
-run mesk cluster leave
-expect_rc 0
-sim calls
-expect_out_has "$(printf "$NOTIFY" PreUnmount)"
-if [ -e "$MARK" ]; then _fail "a shell ran part of the datastore name"; else _pass; fi
-
 echo "$CASES cases over ${#LISTED[@]} commands and $PARAMETERS parameters"
 finish

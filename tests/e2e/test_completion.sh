@@ -6,18 +6,11 @@
 PLUGINS="${MESK_TEST_PLUGIN_DIR:-$(dirname "$AUTOCLI")/../../test-plugins}"
 export AUTOCLI_PLUGIN_PATH="$AUTOCLI_PLUGIN_PATH:$PLUGINS"
 
-case_ "__complete over both plug-ins: namespaces, commands, values"
-while IFS='|' read -r expected words; do
-    # shellcheck disable=SC2086
-    eval "set -- $words"
-    ok __complete "$@"
-    expect_err ""
-    expect_eq "$(printf '%s' "$OUT" | tr '\n' ' ')" "$expected" "__complete $words"
-done <<'CASES'
-other :4|mesk o
-cluster vdisk vmnamespace vmswap vmem :4|mesk policy getdefault -c ''
-true false :4|mesk storage automode set --enabled ''
-CASES
+case_ "__complete over both plug-ins"
+ok __complete mesk o
+expect_out "other
+:4"
+expect_err ""
 
 case_ "a plug-in that cannot be loaded stays silent during completion"
 BROKEN="$E2E_DIR/plugins"

@@ -5,15 +5,6 @@
 
 json() { jq -c "$1" <<<"$OUT"; }
 
-case_ "a reset host is the default host, with its files"
-sim show
-expect_eq "$(json '[.cluster.enabled, [.storage.disks[].isSsd], (.storage.disks | map(.diskGroupUuid) | unique), .settings.datastoreName, .resync, .services.mesktraced]')" \
-    '[false,[true,false,false,false],[""],"meskDatastore",{"bandwidth":0,"throttle":0},{"state":"running","statusFails":false,"restartFailures":0}]' "host"
-for file in /etc/orvane/mesk/mesktraced.conf /etc/init.d/mesktraced \
-    /usr/lib/orvane/tavord/bin/notifyDatastore.py; do
-    [ -f "$MESK_HOST_ROOT$file" ] && _pass || _fail "no $file below the host root"
-done
-
 case_ "show | load round-trips exactly; a bad document is refused and changes nothing"
 "$HOSTSIM" populate --luns 20 --agents 3 --nics 2
 before=$("$HOSTSIM" show)

@@ -10,7 +10,6 @@ host_agents() { "$HOSTSIM" show | jq -c .unicastAgents; }
 case_ "a node and a witness are added and listed"
 ok mesk cluster new
 ok mesk cluster unicastagent add -t node -u $NODE -U true -a 10.0.0.1 -i zuvnic1
-expect_out ""
 ok mesk cluster unicastagent add -a fe80::9 -p 4000
 expect_eq "$(host_agents)" "[\"$NODE;0;1;10.0.0.1;12321;zuvnic1\",\"$ZERO;1;0;fe80::9;4000;\"]" \
     "agents on the host"
