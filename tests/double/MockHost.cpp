@@ -84,9 +84,6 @@ MockHost::MockHost(MockMeskInfo& info) {
     ON_CALL(*this, name).WillByDefault(Invoke([this] parameters { return Base::name arguments; }));
     HOSTCTL_UTIL_CONVERSIONS(MESK_AS_THE_LIBRARY)
 #undef MESK_AS_THE_LIBRARY
-    ON_CALL(*this, GetFormattedSystemDateTime()).WillByDefault(Invoke([] {
-        return std::string("2026-11-22 10:00:00");
-    }));
     ON_CALL(*this, UUID_CreateRandom()).WillByDefault(Invoke([this] {
         return Base::UUID_CreateRandom();
     }));

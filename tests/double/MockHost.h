@@ -67,9 +67,8 @@ enum class InfoKind {
 
 class MockHost : public HostCtlSim::HostBackend {
   public:
-    // By default GetMeskPlugin hands out a plug-in whose info objects forward to `info`, the
-    // system time is 2026-11-22 10:00:00, and the other conversions and the UUID functions
-    // behave as the real library's.
+    // By default GetMeskPlugin hands out a plug-in whose info objects forward to `info`, and
+    // the conversions and the UUID functions behave as the real library's.
     explicit MockHost(MockMeskInfo& info);
     ~MockHost() override;
 

@@ -38,12 +38,6 @@ std::string Repeat(const std::string& piece, size_t count) {
     return text;
 }
 
-MeskConfigGeneration Generation(const std::string& uuid, uint64_t number, uint64_t timestamp) {
-    MeskConfigGeneration generation;
-    generation.uuid = uuid, generation.generation = number, generation.timestamp = timestamp;
-    return generation;
-}
-
 // A witness host in the cluster kUuid; each field of the report has a source of its own.
 class ClusterGetTest : public HostTest {
   protected:
@@ -63,7 +57,7 @@ class ClusterGetTest : public HostTest {
             }));
         ON_CALL(host, GetUnicastMode(_)).WillByDefault(SetArgReferee<0>(true));
         ON_CALL(host, GetFormattedSystemDateTime()).WillByDefault(Return("now"));
-        ON_CALL(info, GetConfigGeneration()).WillByDefault(Return(Generation("g", 9, 0)));
+        ON_CALL(info, GetConfigGeneration()).WillByDefault(Return(MeskConfigGeneration{"g", 9, 0}));
     }
     ~ClusterGetTest() override { unsetenv("TZ"); }
 };
@@ -96,11 +90,10 @@ TEST_F(ClusterGetTest, ConfigGenerationShowsUuidNumberAndLocalTimestamp) {
         MeskConfigGeneration generation;
         std::string expected;
     } cases[] = {
-        {"UTC", Generation("", 0, 0), "None 0 0.000"},
-        {"UTC", Generation("u", UINT64_MAX, 1500000000007),
-         "u 18446744073709551615 2017-07-14T02:40:00.007"},
-        {"XYZ-2", Generation("u", 1, 1500000000120), "u 1 2017-07-14T04:40:00.120"},
-        {"XYZ-2", Generation("u", 1, 5), "u 1 0.005"},
+        {"UTC", {"", 0, 0}, "None 0 0.000"},
+        {"UTC", {"u", UINT64_MAX, 1500000000007}, "u 18446744073709551615 2017-07-14T02:40:00.007"},
+        {"XYZ-2", {"u", 1, 1500000000120}, "u 1 2017-07-14T04:40:00.120"},
+        {"XYZ-2", {"u", 1, 5}, "u 1 0.005"},
     };
     for (const auto& c : cases) {
         setenv("TZ", c.zone, 1);

@@ -57,10 +57,6 @@ TEST_F(UnicastAgentTest, AddAndRemoveFillDefaultsAndRefreshOnlyForANode) {
          {},
          "Add(" + none + ", true, false, v4:10.1.2.3, 12321, false, )"},
         {ClusterUnicastAgentAdd::New(),
-         "type=witness uuid=w9 addr=10.0.0.9",
-         {},
-         "Add(w9, true, false, v4:10.0.0.9, 12321, false, )"},
-        {ClusterUnicastAgentAdd::New(),
          "type=node uuid=n1 supports-unicast=true addr=fe80::1 port=4294967301 "
          "bound-interface-name=zuvnic1",
          {"W1"},

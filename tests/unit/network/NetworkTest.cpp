@@ -107,9 +107,7 @@ TEST_F(NetworkTest, InUseDecidesBetweenAddAndSet) {
         {true, true, false, "",
          "InUse(zuvnic1, mesk) SetZuvNicConfig(zuvnic1 " + kCurrent + " witness)",
          "true, complete"},
-        {true, true, false, "traffic-type=witness traffic-type=bogus", "InUse(zuvnic1, mesk)",
-         "Unknown traffic type" + none},
-        {true, true, false, "traffic-type=Mesk", "InUse(zuvnic1, mesk)",
+        {true, true, false, "traffic-type=witness traffic-type=Mesk", "InUse(zuvnic1, mesk)",
          "Unknown traffic type" + none},
     };
     for (const auto& c : cases) {

