@@ -10,6 +10,7 @@
 #include <cstdlib>
 #include <memory>
 #include <string>
+#include <string_view>
 
 #include "FuzzCheck.h"
 #include "StateDocument.h"
@@ -55,16 +56,16 @@ StateStore& Store() {
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
     if (size == 0) return 0;
     const bool merge = (data[0] & 1) != 0;
-    Json input = Json::parse(data + 1, data + size, nullptr, false);
-    if (input.is_discarded()) return 0;
-
-    Json document = input;
-    if (merge) {
-        document = HostCtlSim::DefaultHost();
-        document.merge_patch(input);
-    }
     Json normalized;
     try {
+        Json input = HostCtlSim::ParseDocument(
+            std::string_view(reinterpret_cast<const char*>(data) + 1, size - 1));
+        if (input.is_discarded()) return 0;
+        Json document = input;
+        if (merge) {
+            document = HostCtlSim::DefaultHost();
+            document.merge_patch(input);
+        }
         normalized = HostCtlSim::NormalizeHost(document);
     } catch (const DocumentError&) {
         return 0;

@@ -137,7 +137,7 @@ std::string ReadInput(const std::string& file) {
 int Load(const std::vector<std::string>& args) {
     bool merge = !args.empty() && args[0] == "--merge";
     if (args.size() != (merge ? 2u : 1u)) throw UsageError("load takes [--merge] FILE or -");
-    Json input = Json::parse(ReadInput(args.back()), nullptr, false);
+    Json input = HostCtlSim::ParseDocument(ReadInput(args.back()));
     if (input.is_discarded()) throw std::runtime_error(args.back() + ": not a JSON document");
     Host host;
     if (merge) {

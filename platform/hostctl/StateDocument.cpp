@@ -180,6 +180,30 @@ std::string NumberedUuid(const char* prefix, uint64_t number) {
 
 }  // namespace
 
+Json ParseDocument(std::string_view text) {
+    // Brackets are counted outside strings only; the parser refuses what is not JSON.
+    int depth = 0;
+    bool inString = false;
+    for (size_t i = 0; i < text.size(); ++i) {
+        char c = text[i];
+        if (inString) {
+            if (c == '\\') {
+                ++i;
+            } else if (c == '"') {
+                inString = false;
+            }
+        } else if (c == '"') {
+            inString = true;
+        } else if ((c == '[' || c == '{') && ++depth > kMaxDocumentDepth) {
+            throw DocumentError("nested deeper than " + std::to_string(kMaxDocumentDepth) +
+                                " levels of arrays and objects");
+        } else if (c == ']' || c == '}') {
+            --depth;
+        }
+    }
+    return Json::parse(text, nullptr, false);
+}
+
 Json DiskDocument(const Disk& disk) {
     Json document;
     ForEachDiskField(

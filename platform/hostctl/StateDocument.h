@@ -7,6 +7,7 @@
 #include <cstdint>
 #include <stdexcept>
 #include <string>
+#include <string_view>
 
 namespace HostCtlSim {
 
@@ -18,6 +19,15 @@ class DocumentError : public std::runtime_error {
   public:
     using std::runtime_error::runtime_error;
 };
+
+// The deepest nesting of arrays and objects that a host document or merge patch may have: a
+// host needs 4 levels. Deeper input is refused before anything walks it, since copying,
+// merging and printing a document recurse once per level and would run out of stack.
+constexpr int kMaxDocumentDepth = 64;
+
+// Parses the text of a host document or merge patch. Returns a discarded value when the text
+// is not JSON; throws DocumentError when it is nested deeper than kMaxDocumentDepth.
+Json ParseDocument(std::string_view text);
 
 // The state of a fresh host: not in a cluster, one SSD and three HDDs unclaimed, no
 // interfaces, no agents, no default policies, the tracing service running.

@@ -21,6 +21,21 @@ TABLE
 echo '{ not json' | "$HOSTSIM" load - 2>/dev/null && _fail "accepted text that is not JSON" || _pass
 expect_eq "$("$HOSTSIM" show)" "$before" "document after refused loads"
 
+case_ "200,000 levels deep is refused untouched; the fuzz seeds load as their names say"
+deep="{\"policies\":$(yes '{"x":' | head -n 200000 | tr -d '\n')0$(printf '%200000s' | tr ' ' '}')}"
+for mode in "" --merge; do
+    sim load $mode - <<<"$deep"
+    expect_rc 1
+    expect_err "hostsim load: invalid host document: nested deeper than 64 levels of arrays and objects"
+done
+expect_eq "$("$HOSTSIM" show)" "$before" "document after deep loads"
+for seed in "$(dirname "$0")"/../../fuzz/corpus/fuzz_host_document/*; do
+    mode=$([ "$(head -c 1 "$seed")" = 1 ] && echo --merge)
+    [[ "${seed##*/}" =~ ^(merge_bad_.*|too_deep)$ ]] && want=1 || want=0
+    tail -c +2 "$seed" | "$HOSTSIM" load $mode - 2>/dev/null
+    expect_eq "$?" "$want" "load $mode ${seed##*/} (fuzz/corpus/regen remakes the seeds)"
+done
+
 case_ "populate claims disks into groups of one SSD and up to seven HDDs"
 "$HOSTSIM" populate --luns 10
 sim show
