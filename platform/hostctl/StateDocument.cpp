@@ -204,6 +204,24 @@ Json ParseDocument(std::string_view text) {
     return Json::parse(text, nullptr, false);
 }
 
+std::vector<std::string> AddMissingKeys(Json& document, const Json& defaults,
+                                        const std::string& path) {
+    std::vector<std::string> added;
+    if (!document.is_object() || !defaults.is_object()) return added;
+    for (auto it = defaults.begin(); it != defaults.end(); ++it) {
+        std::string key = path.empty() ? it.key() : path + "." + it.key();
+        if (!document.contains(it.key())) {
+            document[it.key()] = it.value();
+            added.push_back(key);
+        } else {
+            for (auto& inner : AddMissingKeys(document[it.key()], it.value(), key)) {
+                added.push_back(std::move(inner));
+            }
+        }
+    }
+    return added;
+}
+
 Json DiskDocument(const Disk& disk) {
     Json document;
     ForEachDiskField(

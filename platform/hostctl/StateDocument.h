@@ -8,6 +8,7 @@
 #include <stdexcept>
 #include <string>
 #include <string_view>
+#include <vector>
 
 namespace HostCtlSim {
 
@@ -28,6 +29,16 @@ constexpr int kMaxDocumentDepth = 64;
 // Parses the text of a host document or merge patch. Returns a discarded value when the text
 // is not JSON; throws DocumentError when it is nested deeper than kMaxDocumentDepth.
 Json ParseDocument(std::string_view text);
+
+// The version of the document's keys, kept in the state beside them: raised whenever a key
+// is added, so that a state written before gets the new keys' defaults when it is opened.
+// Version 1: every state written before the version was kept.
+constexpr int64_t kDocumentVersion = 1;
+
+// Adds to the objects of `document` every key of `defaults` that they lack, with its default
+// value (arrays are taken as they are); returns the added keys' paths ("cluster.witness").
+std::vector<std::string> AddMissingKeys(Json& document, const Json& defaults,
+                                        const std::string& path = "");
 
 // The state of a fresh host: not in a cluster, one SSD and three HDDs unclaimed, no
 // interfaces, no agents, no default policies, the tracing service running.

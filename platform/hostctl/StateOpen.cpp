@@ -7,6 +7,8 @@
 
 #include <cerrno>
 #include <cstring>
+#include <iostream>
+#include <optional>
 #include <type_traits>
 
 #include "StateStore.h"
@@ -186,8 +188,16 @@ bool StateStore::OpenForReplacement() {
 
 bool StateStore::OpenAs(bool replacing) {
     switch (Inspect()) {
-        case Kind::kHost:
+        case Kind::kHost: {
+            int64_t version = DocumentVersion();
+            if (version > kDocumentVersion) {
+                Disconnect();
+                throw MeskCtlException("Simulated host state " + path_ +
+                                       " was made by a newer hostsim");
+            }
+            if (version < kDocumentVersion && !replacing) AddNewKeys();
             return false;
+        }
         case Kind::kMissing: {
             bool made = Create();
             if (Inspect() != Kind::kHost) Fail("cannot read the host just made");
@@ -210,6 +220,38 @@ bool StateStore::OpenAs(bool replacing) {
     Replace(NormalizeHost(DefaultHost()));
     transaction.Commit();
     return true;
+}
+
+// A state written by an older build lacks the keys added since: they get their defaults, in
+// one change, which the process that makes it reports once.
+void StateStore::AddNewKeys() {
+    auto refuse = [&](const std::string& why) {
+        throw MeskCtlException("Simulated host state " + path_ + " was written by an older build" +
+                               why + "; run 'hostsim reset'");
+    };
+    std::optional<Transaction> transaction;
+    try {
+        transaction.emplace(*this);
+    } catch (const MeskCtlException& error) {
+        refuse(" and cannot be brought up to date (" + std::string(error.what()) + ")");
+    }
+    if (DocumentVersion() >= kDocumentVersion) return;  // another process was first
+    Json host = Dump();
+    Json defaults = DefaultHost();
+    host["services"] = defaults["services"];  // kept in the host's files
+    std::vector<std::string> added = AddMissingKeys(host, defaults);
+    try {
+        host = NormalizeHost(host);
+    } catch (const DocumentError& error) {
+        refuse(" that this one cannot read: " + std::string(error.what()));
+    }
+    Replace(host);
+    transaction->Commit();
+    if (added.empty()) return;
+    std::string list;
+    for (const std::string& key : added) list += (list.empty() ? "" : ", ") + key;
+    std::cerr << "Simulated host state " << path_
+              << " was written by an older build; added with their defaults: " << list << "\n";
 }
 
 // The host is made whole in a file of its own, then renamed into place, so that no process

@@ -12,6 +12,9 @@ namespace HostCtlSim {
 
 namespace {
 
+// The section that holds the version of the document's keys, a number; none in version 1.
+const char* const kVersionSection = "documentVersion";
+
 // The top-level keys stored as sections, in document order.
 const char* const kSections[] = {"host",    "cluster",  "membership", "unicastAgents", "network",
                                  "storage", "settings", "policies",   "resync"};
@@ -296,6 +299,7 @@ void StateStore::Replace(const Json& host) {
         if (value.is_object()) value.erase("disks");
         WriteSection(name, value);
     }
+    WriteSection(kVersionSection, kDocumentVersion);
     static const std::string insert =
         "INSERT INTO disk(position, " + DiskColumns() + ") VALUES(?1, " + DiskParameters(2) + ")";
     Use statement(Statement(insert.c_str()));
@@ -306,6 +310,14 @@ void StateStore::Replace(const Json& host) {
         if (sqlite3_step(statement) != SQLITE_DONE) Fail("cannot write a disk");
         sqlite3_reset(statement);
     }
+}
+
+int64_t StateStore::DocumentVersion() {
+    BeginRead();
+    static const std::string query =
+        std::string("SELECT coalesce((SELECT CAST(value AS INTEGER) FROM section WHERE name = '") +
+        kVersionSection + "'), 1)";
+    return QueryNumber(query.c_str());
 }
 
 std::vector<Fault> StateStore::ReadFaults() {

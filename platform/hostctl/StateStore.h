@@ -91,6 +91,8 @@ class StateStore {
     enum class Kind { kMissing, kHost, kOlderHost };
     Kind Inspect();
     bool OpenAs(bool replacing);
+    int64_t DocumentVersion();
+    void AddNewKeys();
     bool Create();
     void Connect(const std::string& path, bool writable);
     void Disconnect();

@@ -109,6 +109,24 @@ HOSTSIM_STATE="$E2E_DIR/older.db" "$HOSTSIM" reset
 _capture env HOSTSIM_STATE="$E2E_DIR/older.db" "$AUTOCLI" mesk datastore name get
 expect_out "Name: meskDatastore"
 
+case_ "a state of an older build gets the keys added since, or is refused with one message"
+older="INSERT OR REPLACE INTO section VALUES('documentVersion', '0')"
+while IFS='|' read -r sql rc message; do
+    rm "$HOSTSIM_STATE" && "$HOSTSIM" reset
+    sqlite3 "$HOSTSIM_STATE" "$sql"
+    run mesk datastore name get
+    expect_rc "$rc"
+    expect_err_has "Simulated host state $HOSTSIM_STATE $message"
+done <<TABLE
+$older; INSERT OR REPLACE INTO section VALUES('documentVersion', '99')|1|was made by a newer hostsim
+$older; UPDATE section SET value = json_set(value, '\$.witness', 1) WHERE name = 'cluster'|1|was written by an older build that this one cannot read: cluster.witness: expected true or false; run 'hostsim reset'
+$older; UPDATE section SET value = json_remove(value, '\$.witness') WHERE name = 'cluster'; UPDATE section SET value = json_remove(value, '\$.datastoreName') WHERE name = 'settings'|0|was written by an older build; added with their defaults: cluster.witness, settings.datastoreName
+TABLE
+run mesk datastore name get
+expect_eq "$OUT|$ERR" "Name: meskDatastore|" "the second invocation"
+"$HOSTSIM" show | "$HOSTSIM" load -
+expect_eq "$?" 0 "show | load"
+
 case_ "the call log shows the last invocation's calls and scripts in order"
 "$HOSTSIM" reset
 run mesk cluster new
