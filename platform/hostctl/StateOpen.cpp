@@ -147,14 +147,25 @@ StateStore::Kind StateStore::Inspect() {
     }
     if (file.st_size == 0) return Kind::kMissing;
     {
+        // The database header's marks are read before SQLite sees the file: opening another
+        // program's database in WAL mode would leave a log and an index beside it.
         Descriptor fd(open(path_.c_str(), O_RDONLY | O_CLOEXEC));
-        char header[16] = {};
+        unsigned char header[100] = {};
         if (fd.get() < 0 || read(fd.get(), header, sizeof header) < 0) {
             throw MeskCtlException("Simulated host state " + path_ +
                                    " cannot be read: " + std::strerror(errno));
         }
-        if (std::memcmp(header, "SQLite format 3", sizeof header) != 0) {
+        if (std::memcmp(header, "SQLite format 3", 16) != 0) {
             throw MeskCtlException("Simulated host state " + path_ + " is not an SQLite database");
+        }
+        auto mark = [&](size_t offset) {  // big-endian, at its offset in the header
+            return int64_t(header[offset]) << 24 | header[offset + 1] << 16 |
+                   header[offset + 2] << 8 | header[offset + 3];
+        };
+        // Only the first hostsim's hosts have no application id; their version is 1.
+        if (mark(68) != kApplicationId && (mark(68) != 0 || mark(60) != 1)) {
+            throw MeskCtlException("Simulated host state " + path_ +
+                                   " is another program's SQLite database, not a simulated host");
         }
     }
     Connect(path_, false);

@@ -87,17 +87,17 @@ expect_eq "$(status_of restart) $(status_of restart) $(status_of status)" "1 1 1
 
 case_ "state that is not a simulated host is refused and left as it is"
 printf 'not a database\n' >"$E2E_DIR/text"
-sqlite3 "$E2E_DIR/other.db" "CREATE TABLE t(x); INSERT INTO t VALUES(1);"
+sqlite3 "$E2E_DIR/other.db" "PRAGMA journal_mode=WAL; CREATE TABLE t(x); INSERT INTO t VALUES(1);" >/dev/null
 sqlite3 "$E2E_DIR/older.db" "PRAGMA user_version=1; CREATE TABLE section(name TEXT PRIMARY KEY);"
 while IFS='|' read -r state message; do
-    before=$(sha256sum "$state" 2>/dev/null)
+    before=$(sha256sum "$state" "$state"-* 2>/dev/null)
     for command in "$AUTOCLI mesk datastore name get" "$HOSTSIM show" "$HOSTSIM reset"; do
         [[ "$state" == *older.db && "$command" == *reset ]] && continue
         _capture env HOSTSIM_STATE="$state" $command
         expect_rc 1
         expect_err_has "Simulated host state $state $message"
     done
-    expect_eq "$(sha256sum "$state" 2>/dev/null)" "$before" "$state afterwards"
+    expect_eq "$(sha256sum "$state" "$state"-* 2>/dev/null)" "$before" "$state afterwards"
 done <<TABLE
 $E2E_DIR/text|is not an SQLite database
 $E2E_DIR/other.db|is another program's SQLite database, not a simulated host
