@@ -82,7 +82,7 @@ struct Host {
     HostRoot root{options.hostRoot};
 
     StateStore& Open() {
-        if (store.Open()) root.Create(HostCtlSim::DefaultHost()["services"]);
+        store.Open([&] { root.Create(HostCtlSim::DefaultHost()["services"]); });
         return store;
     }
 
@@ -95,7 +95,7 @@ struct Host {
     // Replaces the whole host by a normalized document; `fresh` also renews the host's files
     // and forgets the injected failures and the call log.
     void Replace(const Json& document, bool fresh) {
-        if (store.OpenForReplacement()) root.Create(HostCtlSim::DefaultHost()["services"]);
+        store.OpenForReplacement([&] { root.Create(HostCtlSim::DefaultHost()["services"]); });
         StateStore::Transaction transaction(store);
         store.Replace(document);
         if (fresh) store.ClearFaults();

@@ -97,13 +97,13 @@ SimHost::~SimHost() {
 StateStore& SimHost::Store() {
     if (store_) return *store_;
     auto store = std::make_unique<StateStore>(options_.statePath);
-    if (store->Open()) {
+    store->Open([&] {
         try {
             root_.Create(DefaultHost()["services"]);
         } catch (const std::exception&) {
             // A host without its files still serves every operation but MeskExec.
         }
-    }
+    });
     faults_ = store->ReadFaults();
     store_ = std::move(store);
     return *store_;

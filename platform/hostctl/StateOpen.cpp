@@ -189,15 +189,15 @@ StateStore::Kind StateStore::Inspect() {
                            " is another program's SQLite database, not a simulated host");
 }
 
-bool StateStore::Open() {
-    return db_ == nullptr && OpenAs(false);
+bool StateStore::Open(const std::function<void()>& makeFiles) {
+    return db_ == nullptr && OpenAs(false, makeFiles);
 }
 
-bool StateStore::OpenForReplacement() {
-    return db_ == nullptr && OpenAs(true);
+bool StateStore::OpenForReplacement(const std::function<void()>& makeFiles) {
+    return db_ == nullptr && OpenAs(true, makeFiles);
 }
 
-bool StateStore::OpenAs(bool replacing) {
+bool StateStore::OpenAs(bool replacing, const std::function<void()>& makeFiles) {
     switch (Inspect()) {
         case Kind::kHost: {
             int64_t version = DocumentVersion();
@@ -210,7 +210,7 @@ bool StateStore::OpenAs(bool replacing) {
             return false;
         }
         case Kind::kMissing: {
-            bool made = Create();
+            bool made = Create(makeFiles);
             if (Inspect() != Kind::kHost) Fail("cannot read the host just made");
             return made;
         }
@@ -229,6 +229,7 @@ bool StateStore::OpenAs(bool replacing) {
         "DROP TABLE IF EXISTS section;");
     Exec(Schema().c_str());
     Replace(NormalizeHost(DefaultHost()));
+    if (makeFiles) makeFiles();
     transaction.Commit();
     return true;
 }
@@ -267,8 +268,8 @@ void StateStore::AddNewKeys() {
 
 // The host is made whole in a file of its own, then renamed into place, so that no process
 // ever sees half a host; a lock on the directory makes the processes that find no host at
-// once make it one at a time, and all but the first find it made.
-bool StateStore::Create() {
+// once make it one at a time, and all but the first find it made, files included.
+bool StateStore::Create(const std::function<void()>& makeFiles) {
     MakeDirectories(path_);
     auto refuse = [&](const char* what) {
         throw MeskCtlException("Simulated host state " + path_ + ": cannot " + what + ": " +
@@ -299,6 +300,7 @@ bool StateStore::Create() {
         Replace(NormalizeHost(DefaultHost()));
         Exec("COMMIT");
         Disconnect();  // copies the log into the file and removes it
+        if (makeFiles) makeFiles();
         if (rename(temporary.c_str(), path_.c_str()) != 0) refuse("create it");
     } catch (...) {
         Disconnect();

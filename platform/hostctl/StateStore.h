@@ -17,6 +17,7 @@
 #include <sqlite3.h>
 
 #include <cstdint>
+#include <functional>
 #include <map>
 #include <string>
 #include <string_view>
@@ -46,9 +47,12 @@ class StateStore {
     // fresh host, made whole before anyone else can see it; returns true iff this call made it.
     // Throws MeskCtlException, naming the path and what is wrong, for anything that is not a
     // simulated host of this version; such a file is left as it was.
-    bool Open();
+    // `makeFiles`, when given, makes the host's files once the new host's tables are ready and
+    // before anyone can see it, so that no process finds the host without its files; when it
+    // throws, no host is made.
+    bool Open(const std::function<void()>& makeFiles = {});
     // Like Open, but a host made by an older hostsim is emptied, to be replaced whole.
-    bool OpenForReplacement();
+    bool OpenForReplacement(const std::function<void()>& makeFiles = {});
     const std::string& Path() const { return path_; }
 
     // A change: BEGIN IMMEDIATE on a read-write connection, rolled back unless committed.
@@ -90,10 +94,10 @@ class StateStore {
   private:
     enum class Kind { kMissing, kHost, kOlderHost };
     Kind Inspect();
-    bool OpenAs(bool replacing);
+    bool OpenAs(bool replacing, const std::function<void()>& makeFiles);
     int64_t DocumentVersion();
     void AddNewKeys();
-    bool Create();
+    bool Create(const std::function<void()>& makeFiles);
     void Connect(const std::string& path, bool writable);
     void Disconnect();
     void BeginRead();

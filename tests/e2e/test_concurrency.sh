@@ -6,11 +6,13 @@ source "$(dirname "$0")/lib.sh"
 
 PROCESSES=50
 
-# Starts "$@" in the background, with its exit status in $E2E_DIR/status.N.
+# Starts autocli "$@" (hostsim "$@" after -h) in the background, with its exit status in
+# $E2E_DIR/status.N.
 spawn() {
-    local n=$1
+    local n=$1 program=$AUTOCLI
     shift
-    ("$AUTOCLI" "$@" >"$E2E_DIR/out.$n" 2>&1; echo $? >"$E2E_DIR/status.$n") &
+    [ "$1" = -h ] && program=$HOSTSIM && shift
+    ("$program" "$@" >"$E2E_DIR/out.$n" 2>&1; echo $? >"$E2E_DIR/status.$n") &
 }
 # How many of the first N processes exited 0; prints the output of the others.
 succeeded() {
@@ -25,22 +27,26 @@ succeeded() {
     echo "$ok"
 }
 
-case_ "$PROCESSES processes add distinct unicast agents to a host that does not exist yet"
-# The first of them makes the host; the others wait for it instead of failing.
-export HOSTSIM_STATE="$E2E_DIR/fresh/state.db"
+case_ "$PROCESSES autocli and hostsim writers on a host that does not exist yet"
+# The first of them makes the host, its files included; the others wait for it instead of
+# failing or finding the host without its files. Every third one is a hostsim merge.
+export HOSTSIM_STATE="$E2E_DIR/fresh/state.db" MESK_HOST_ROOT="$E2E_DIR/fresh/root"
 rm -f "$E2E_DIR"/status.*
 for ((n = 0; n < PROCESSES; n++)); do
+    printf '{"policies": {"class%d": "policy %d"}}' "$n" "$n" >"$E2E_DIR/merge.$n.json"
+    ((n % 3 == 0)) && spawn "$n" -h load --merge "$E2E_DIR/merge.$n.json" && continue
     spawn "$n" mesk cluster unicastagent add -t node -U true -a "10.1.0.$n" -p $((20000 + n)) \
         -u "$(printf '5c0a9e11-0000-4000-8000-%012d' "$n")"
 done
 wait
 expect_eq "$(succeeded $PROCESSES)" "$PROCESSES" "processes that succeeded"
 sim show
-expect_eq "$(jq '.unicastAgents | length' <<<"$OUT")" "$PROCESSES" "agents configured"
 expect_eq "$(jq '[.unicastAgents[] | split(";")[3]] | unique | length' <<<"$OUT")" \
-    "$PROCESSES" "distinct agent addresses"
+    "$((PROCESSES - (PROCESSES + 2) / 3))" "distinct agents configured"
+expect_eq "$(jq '[.policies | keys[] | select(startswith("class"))] | length' <<<"$OUT")" \
+    "$(((PROCESSES + 2) / 3))" "policies merged"
 
-export HOSTSIM_STATE="$E2E_DIR/state.db"
+export HOSTSIM_STATE="$E2E_DIR/state.db" MESK_HOST_ROOT="$E2E_DIR/root"
 
 case_ "$PROCESSES processes tag distinct SSDs"
 # A fresh host with that many unclaimed SSDs, each of a device and UUID of its own.
