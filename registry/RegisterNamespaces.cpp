@@ -3,7 +3,10 @@
 // Adding a command takes, in this order:
 //   1. its class, commands/<area>/<Class>.h and .cpp, shaped like its neighbours (the area's
 //      sources are picked up by CMake; a new area is added to MESK_COMMAND_AREAS in the root
-//      CMakeLists.txt);
+//      CMakeLists.txt); a result's fields are declared once, as the OutputField constants and
+//      kFields array of its source (commands/common/OutputFields.h), which feed the "fields:"
+//      output parameter, the structure and the rows (the test double fails a unit test whose
+//      result strays from that declaration);
 //   2. any host-control operation it needs that does not exist yet: its declaration in
 //      frame/hostctl/, its row in platform/hostctl/Operations.h (which declares it for the
 //      simulated host and the test double), the simulated host's answer in the file of its

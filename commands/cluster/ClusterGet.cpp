@@ -8,6 +8,7 @@
 #include <vector>
 
 #include "MeskConstants.h"
+#include "commands/common/OutputFields.h"
 #include "hostctl/MeskCtlException.h"
 #include "hostctl/MeskPlugin.h"
 #include "hostctl/MeskUtil.h"
@@ -21,6 +22,10 @@ using Kalmor::CallSpec::Input;
 using Kalmor::CallSpec::InputSpec;
 using Kalmor::CallSpec::Output;
 using Kalmor::CallSpec::OutputSpec;
+using Kalmor::MetaObj::META_BOOL;
+using Kalmor::MetaObj::META_INT;
+using Kalmor::MetaObj::META_LIST;
+using Kalmor::MetaObj::META_STRING;
 using Kalmor::MetaObj::MetaBool;
 using Kalmor::MetaObj::MetaInt;
 using Kalmor::MetaObj::MetaList;
@@ -29,6 +34,29 @@ using Kalmor::MetaObj::MetaStruct;
 using ZuvCtl::Mesk::MeskUtil;
 
 namespace {
+
+// The report's fields, in the order shown; ExecuteInternal fills them by these names.
+constexpr OutputField kEnabled{"Enabled", META_BOOL};
+constexpr OutputField kCurrentLocalTime{"Current Local Time", META_STRING};
+constexpr OutputField kLocalNodeUuid{"Local Node UUID", META_STRING};
+constexpr OutputField kLocalNodeType{"Local Node Type", META_STRING};
+constexpr OutputField kLocalNodeState{"Local Node State", META_STRING};
+constexpr OutputField kLocalNodeHealthState{"Local Node Health State", META_STRING};
+constexpr OutputField kMasterUuid{"Sub-Cluster Master UUID", META_STRING};
+constexpr OutputField kBackupUuid{"Sub-Cluster Backup UUID", META_STRING};
+constexpr OutputField kClusterUuid{"Sub-Cluster UUID", META_STRING};
+constexpr OutputField kMembershipEntryRevision{"Sub-Cluster Membership Entry Revision", META_INT};
+constexpr OutputField kMemberCount{"Sub-Cluster Member Count", META_INT};
+constexpr OutputField kMemberUuids{"Sub-Cluster Member UUIDs", META_LIST};
+constexpr OutputField kMembershipUuid{"Sub-Cluster Membership UUID", META_STRING};
+constexpr OutputField kUnicastModeEnabled{"Unicast Mode Enabled", META_BOOL};
+constexpr OutputField kMaintenanceModeState{"Maintenance Mode State", META_STRING};
+constexpr OutputField kConfigGeneration{"Config Generation", META_STRING};
+constexpr OutputField kFields[] = {
+    kEnabled,        kCurrentLocalTime,        kLocalNodeUuid,        kLocalNodeType,
+    kLocalNodeState, kLocalNodeHealthState,    kMasterUuid,           kBackupUuid,
+    kClusterUuid,    kMembershipEntryRevision, kMemberCount,          kMemberUuids,
+    kMembershipUuid, kUnicastModeEnabled,      kMaintenanceModeState, kConfigGeneration};
 
 // The configuration generation's timestamp (milliseconds since the epoch) as local time with
 // three-digit milliseconds and no zone suffix, e.g. "2017-07-14T02:40:00.007". A timestamp
@@ -64,13 +92,8 @@ ClusterGet::ClusterGet() {
     SetMetaDataField("type", "fetcher");
     SetDefaultOutputFormatter("simple");
     SetDefaultOutputParameter("header:MeskClusterGet", "Cluster Information");
-    SetDefaultOutputParameter(
-        "fields:MeskClusterGet",
-        "Enabled,Current Local Time,Local Node UUID,Local Node Type,Local Node State,"
-        "Local Node Health State,Sub-Cluster Master UUID,Sub-Cluster Backup UUID,"
-        "Sub-Cluster UUID,Sub-Cluster Membership Entry Revision,Sub-Cluster Member Count,"
-        "Sub-Cluster Member UUIDs,Sub-Cluster Membership UUID,Unicast Mode Enabled,"
-        "Maintenance Mode State,Config Generation,");
+    // Unlike the other commands' lists, this one ends with a comma.
+    SetDefaultOutputParameter("fields:MeskClusterGet", JoinFieldNames(kFields) + ",");
 }
 
 ClusterGet::~ClusterGet() = default;
@@ -86,25 +109,8 @@ std::shared_ptr<OutputSpec> ClusterGet::GetOutputSpecInternal() {
 }
 
 std::shared_ptr<MetaStruct> ClusterGet::GetOutputStructure() {
-    const std::string& doc = MetaStruct::_docEmpty;
     auto structure = MetaStruct::New("MeskClusterGet");
-    structure->SetField("Enabled", MetaBool::New(), doc);
-    structure->SetField("Current Local Time", MetaString::New(), doc);
-    structure->SetField("Local Node UUID", MetaString::New(), doc);
-    structure->SetField("Local Node Type", MetaString::New(), doc);
-    structure->SetField("Local Node State", MetaString::New(), doc);
-    structure->SetField("Local Node Health State", MetaString::New(), doc);
-    structure->SetField("Sub-Cluster Master UUID", MetaString::New(), doc);
-    structure->SetField("Sub-Cluster Backup UUID", MetaString::New(), doc);
-    structure->SetField("Sub-Cluster UUID", MetaString::New(), doc);
-    structure->SetField("Sub-Cluster Membership Entry Revision", MetaInt::New(), doc);
-    structure->SetField("Sub-Cluster Member Count", MetaInt::New(), doc);
-    structure->SetField("Sub-Cluster Member UUIDs", MetaList::New(Kalmor::MetaObj::META_STRING),
-                        doc);
-    structure->SetField("Sub-Cluster Membership UUID", MetaString::New(), doc);
-    structure->SetField("Unicast Mode Enabled", MetaBool::New(), doc);
-    structure->SetField("Maintenance Mode State", MetaString::New(), doc);
-    structure->SetField("Config Generation", MetaString::New(), doc);
+    AddEmptyFields(*structure, kFields);
     return structure;
 }
 
@@ -148,25 +154,27 @@ void ClusterGet::ExecuteInternal(std::shared_ptr<Input> /*input*/, std::shared_p
 
             // The local time is read last, after every other query, so that it is the time
             // at which the report was put together.
-            result->SetField("Enabled", MetaBool::New(config.enabled), doc);
-            result->SetField("Current Local Time",
+            result->SetField(kEnabled.name, MetaBool::New(config.enabled), doc);
+            result->SetField(kCurrentLocalTime.name,
                              MetaString::New(MeskUtil::GetFormattedSystemDateTime()), doc);
-            result->SetField("Local Node UUID", MetaString::New(localNodeUuid), doc);
-            result->SetField("Local Node Type", MetaString::New(nodeType), doc);
-            result->SetField("Local Node State", MetaString::New(localNodeState), doc);
-            result->SetField("Local Node Health State", MetaString::New(localNodeHealthState), doc);
-            result->SetField("Sub-Cluster Master UUID", MetaString::New(masterUuid), doc);
-            result->SetField("Sub-Cluster Backup UUID", MetaString::New(backupUuid), doc);
-            result->SetField("Sub-Cluster UUID", MetaString::New(config.clusterUuid), doc);
-            result->SetField("Sub-Cluster Membership Entry Revision",
+            result->SetField(kLocalNodeUuid.name, MetaString::New(localNodeUuid), doc);
+            result->SetField(kLocalNodeType.name, MetaString::New(nodeType), doc);
+            result->SetField(kLocalNodeState.name, MetaString::New(localNodeState), doc);
+            result->SetField(kLocalNodeHealthState.name, MetaString::New(localNodeHealthState),
+                             doc);
+            result->SetField(kMasterUuid.name, MetaString::New(masterUuid), doc);
+            result->SetField(kBackupUuid.name, MetaString::New(backupUuid), doc);
+            result->SetField(kClusterUuid.name, MetaString::New(config.clusterUuid), doc);
+            result->SetField(kMembershipEntryRevision.name,
                              MetaInt::New(static_cast<int64_t>(membershipEntryRevision)), doc);
-            result->SetField("Sub-Cluster Member Count",
-                             MetaInt::New(static_cast<int64_t>(members.size())), doc);
-            result->SetField("Sub-Cluster Member UUIDs", memberUuids, doc);
-            result->SetField("Sub-Cluster Membership UUID", MetaString::New(membershipUuid), doc);
-            result->SetField("Unicast Mode Enabled", MetaBool::New(unicastMode), doc);
-            result->SetField("Maintenance Mode State", MetaString::New(maintenanceModeState), doc);
-            result->SetField("Config Generation", MetaString::New(configGeneration), doc);
+            result->SetField(kMemberCount.name, MetaInt::New(static_cast<int64_t>(members.size())),
+                             doc);
+            result->SetField(kMemberUuids.name, memberUuids, doc);
+            result->SetField(kMembershipUuid.name, MetaString::New(membershipUuid), doc);
+            result->SetField(kUnicastModeEnabled.name, MetaBool::New(unicastMode), doc);
+            result->SetField(kMaintenanceModeState.name, MetaString::New(maintenanceModeState),
+                             doc);
+            result->SetField(kConfigGeneration.name, MetaString::New(configGeneration), doc);
         }
     } catch (const MeskCtlException& e) {
         output->AddErrorMessage(e.GetMessage());

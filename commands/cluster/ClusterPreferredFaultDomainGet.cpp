@@ -3,6 +3,7 @@
 #include <string>
 
 #include "MeskConstants.h"
+#include "commands/common/OutputFields.h"
 #include "hostctl/MeskCtlException.h"
 #include "hostctl/MeskPlugin.h"
 #include "hostctl/MeskUtil.h"
@@ -15,9 +16,19 @@ using Kalmor::CallSpec::Input;
 using Kalmor::CallSpec::InputSpec;
 using Kalmor::CallSpec::Output;
 using Kalmor::CallSpec::OutputSpec;
+using Kalmor::MetaObj::META_STRING;
 using Kalmor::MetaObj::MetaString;
 using Kalmor::MetaObj::MetaStruct;
 using ZuvCtl::Mesk::MeskUtil;
+
+namespace {
+
+// The result's fields, in the order shown; ExecuteInternal fills them by these names.
+constexpr OutputField kName{"Preferred Fault Domain Name", META_STRING};
+constexpr OutputField kId{"Preferred Fault Domain Id", META_STRING};
+constexpr OutputField kFields[] = {kName, kId};
+
+}  // namespace
 
 std::shared_ptr<ClusterPreferredFaultDomainGet> ClusterPreferredFaultDomainGet::New() {
     return std::make_shared<ClusterPreferredFaultDomainGet>();
@@ -43,8 +54,7 @@ std::shared_ptr<OutputSpec> ClusterPreferredFaultDomainGet::GetOutputSpecInterna
 
 std::shared_ptr<MetaStruct> ClusterPreferredFaultDomainGet::GetOutputStructure() {
     auto structure = MetaStruct::New("PreferredFaultDomain");
-    structure->SetField("Preferred Fault Domain Name", MetaString::New(), MetaStruct::_docEmpty);
-    structure->SetField("Preferred Fault Domain Id", MetaString::New(), MetaStruct::_docEmpty);
+    AddEmptyFields(*structure, kFields);
     return structure;
 }
 
@@ -67,9 +77,8 @@ void ClusterPreferredFaultDomainGet::ExecuteInternal(std::shared_ptr<Input> /*in
         MeskUtil::GetPreferredFaultDomainInfo(id, name);
 
         auto result = GetOutputStructure();
-        result->SetField("Preferred Fault Domain Name", MetaString::New(name),
-                         MetaStruct::_docEmpty);
-        result->SetField("Preferred Fault Domain Id", MetaString::New(id), MetaStruct::_docEmpty);
+        result->SetField(kName.name, MetaString::New(name), MetaStruct::_docEmpty);
+        result->SetField(kId.name, MetaString::New(id), MetaStruct::_docEmpty);
         output->SetRootObject(result);
         output->SetComplete();
     } catch (const MeskCtlException& e) {

@@ -6,6 +6,7 @@
 
 #include "MeskConstants.h"
 #include "commands/cluster/UnicastAgent.h"
+#include "commands/common/OutputFields.h"
 #include "hostctl/MeskCtlException.h"
 #include "hostctl/MeskPlugin.h"
 #include "hostctl/MeskUtil.h"
@@ -18,6 +19,9 @@ using Kalmor::CallSpec::Input;
 using Kalmor::CallSpec::InputSpec;
 using Kalmor::CallSpec::Output;
 using Kalmor::CallSpec::OutputSpec;
+using Kalmor::MetaObj::META_BOOL;
+using Kalmor::MetaObj::META_INT;
+using Kalmor::MetaObj::META_STRING;
 using Kalmor::MetaObj::MetaBool;
 using Kalmor::MetaObj::MetaInt;
 using Kalmor::MetaObj::MetaList;
@@ -26,6 +30,16 @@ using Kalmor::MetaObj::MetaStruct;
 using ZuvCtl::Mesk::MeskUtil;
 
 namespace {
+
+// An agent's fields, in the order shown; ExecuteInternal fills them by these names.
+constexpr OutputField kNodeUuid{"NodeUuid", META_STRING};
+constexpr OutputField kIsWitness{"IsWitness", META_INT};
+constexpr OutputField kSupportsUnicast{"Supports Unicast", META_BOOL};
+constexpr OutputField kIpAddress{"IP Address", META_STRING};
+constexpr OutputField kPort{"Port", META_INT};
+constexpr OutputField kIfaceName{"Iface Name", META_STRING};
+constexpr OutputField kFields[] = {kNodeUuid,  kIsWitness, kSupportsUnicast,
+                                   kIpAddress, kPort,      kIfaceName};
 
 // A number field as atoi reads it: leading blanks and digits only, so "yes" or "" is 0.
 int AtoI(const std::string& text) {
@@ -44,8 +58,7 @@ ClusterUnicastAgentList::ClusterUnicastAgentList() {
     SetMetaDataField("type", "operation");
     SetDefaultOutputFormatter("table");
     SetDefaultOutputParameter("header:UnicastAgentList", "Unicast Agent");
-    SetDefaultOutputParameter("fields:UnicastAgentList",
-                              "NodeUuid,IsWitness,Supports Unicast,IP Address,Port,Iface Name");
+    SetDefaultOutputParameter("fields:UnicastAgentList", JoinFieldNames(kFields));
 }
 
 ClusterUnicastAgentList::~ClusterUnicastAgentList() = default;
@@ -62,12 +75,7 @@ std::shared_ptr<OutputSpec> ClusterUnicastAgentList::GetOutputSpecInternal() {
 
 std::shared_ptr<MetaStruct> ClusterUnicastAgentList::GetOutputStructure() {
     auto structure = MetaStruct::New("UnicastAgentList");
-    structure->SetField("NodeUuid", MetaString::New(), MetaStruct::_docEmpty);
-    structure->SetField("IsWitness", MetaInt::New(), MetaStruct::_docEmpty);
-    structure->SetField("Supports Unicast", MetaBool::New(), MetaStruct::_docEmpty);
-    structure->SetField("IP Address", MetaString::New(), MetaStruct::_docEmpty);
-    structure->SetField("Port", MetaInt::New(), MetaStruct::_docEmpty);
-    structure->SetField("Iface Name", MetaString::New(), MetaStruct::_docEmpty);
+    AddEmptyFields(*structure, kFields);
     return structure;
 }
 
@@ -120,21 +128,22 @@ void ClusterUnicastAgentList::ExecuteInternal(std::shared_ptr<Input> /*input*/,
             }
 
             auto agent = GetOutputStructure();
-            agent->SetField("NodeUuid", MetaString::New(fields.Text(UnicastAgentEntry::kNodeUuid)),
+            agent->SetField(kNodeUuid.name,
+                            MetaString::New(fields.Text(UnicastAgentEntry::kNodeUuid)),
                             MetaStruct::_docEmpty);
-            agent->SetField("IsWitness",
+            agent->SetField(kIsWitness.name,
                             MetaInt::New(AtoI(fields.Text(UnicastAgentEntry::kIsWitness))),
                             MetaStruct::_docEmpty);
             agent->SetField(
-                "Supports Unicast",
+                kSupportsUnicast.name,
                 MetaBool::New(AtoI(fields.Text(UnicastAgentEntry::kSupportsUnicast)) != 0),
                 MetaStruct::_docEmpty);
             // The address is shown as the library gave it, unchecked.
-            agent->SetField("IP Address", MetaString::New(fields.Text(UnicastAgentEntry::kIp)),
+            agent->SetField(kIpAddress.name, MetaString::New(fields.Text(UnicastAgentEntry::kIp)),
                             MetaStruct::_docEmpty);
-            agent->SetField("Port", MetaInt::New(AtoI(fields.Text(UnicastAgentEntry::kPort))),
+            agent->SetField(kPort.name, MetaInt::New(AtoI(fields.Text(UnicastAgentEntry::kPort))),
                             MetaStruct::_docEmpty);
-            agent->SetField("Iface Name",
+            agent->SetField(kIfaceName.name,
                             MetaString::New(fields.Text(UnicastAgentEntry::kIfaceName)),
                             MetaStruct::_docEmpty);
             agents->Add(agent);

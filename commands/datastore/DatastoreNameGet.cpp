@@ -1,6 +1,7 @@
 #include "commands/datastore/DatastoreNameGet.h"
 
 #include "MeskConstants.h"
+#include "commands/common/OutputFields.h"
 #include "hostctl/MeskCtlException.h"
 #include "hostctl/MeskPlugin.h"
 
@@ -12,8 +13,17 @@ using Kalmor::CallSpec::Input;
 using Kalmor::CallSpec::InputSpec;
 using Kalmor::CallSpec::Output;
 using Kalmor::CallSpec::OutputSpec;
+using Kalmor::MetaObj::META_STRING;
 using Kalmor::MetaObj::MetaString;
 using Kalmor::MetaObj::MetaStruct;
+
+namespace {
+
+// The result's fields; ExecuteInternal fills them by these names.
+constexpr OutputField kName{"Name", META_STRING};
+constexpr OutputField kFields[] = {kName};
+
+}  // namespace
 
 std::shared_ptr<DatastoreNameGet> DatastoreNameGet::New() {
     return std::make_shared<DatastoreNameGet>();
@@ -39,7 +49,7 @@ std::shared_ptr<OutputSpec> DatastoreNameGet::GetOutputSpecInternal() {
 
 std::shared_ptr<MetaStruct> DatastoreNameGet::GetOutputStructure() {
     auto structure = MetaStruct::New("DatastoreName");
-    structure->SetField("Name", MetaString::New(), MetaStruct::_docEmpty);
+    AddEmptyFields(*structure, kFields);
     return structure;
 }
 
@@ -49,7 +59,8 @@ void DatastoreNameGet::ExecuteInternal(std::shared_ptr<Input> /*input*/,
         auto result = GetOutputStructure();
         auto plugin = HostCtl::MeskPluginFactory::GetMeskPlugin();
         auto info = plugin->GetMeskInfo();
-        result->SetField("Name", MetaString::New(info->GetDatastoreName()), MetaStruct::_docEmpty);
+        result->SetField(kName.name, MetaString::New(info->GetDatastoreName()),
+                         MetaStruct::_docEmpty);
         output->SetRootObject(result);
         output->SetComplete();
     } catch (const MeskCtlException& e) {

@@ -3,6 +3,7 @@
 #include <string>
 
 #include "MeskConstants.h"
+#include "commands/common/OutputFields.h"
 #include "hostctl/MeskCtlException.h"
 #include "hostctl/MeskPlugin.h"
 #include "hostctl/MeskUtil.h"
@@ -15,8 +16,18 @@ using Kalmor::CallSpec::Input;
 using Kalmor::CallSpec::InputSpec;
 using Kalmor::CallSpec::Output;
 using Kalmor::CallSpec::OutputSpec;
+using Kalmor::MetaObj::META_STRING;
 using Kalmor::MetaObj::MetaString;
 using Kalmor::MetaObj::MetaStruct;
+
+namespace {
+
+// The result's fields, in the order shown; ExecuteInternal fills them by these names.
+constexpr OutputField kFaultDomainName{"faultDomainName", META_STRING};
+constexpr OutputField kFaultDomainId{"faultDomainId", META_STRING};
+constexpr OutputField kFields[] = {kFaultDomainName, kFaultDomainId};
+
+}  // namespace
 
 std::shared_ptr<FaultDomainGet> FaultDomainGet::New() {
     return std::make_shared<FaultDomainGet>();
@@ -42,8 +53,7 @@ std::shared_ptr<OutputSpec> FaultDomainGet::GetOutputSpecInternal() {
 
 std::shared_ptr<MetaStruct> FaultDomainGet::GetOutputStructure() {
     auto structure = MetaStruct::New("FaultDomain");
-    structure->SetField("faultDomainName", MetaString::New(), MetaStruct::_docEmpty);
-    structure->SetField("faultDomainId", MetaString::New(), MetaStruct::_docEmpty);
+    AddEmptyFields(*structure, kFields);
     return structure;
 }
 
@@ -53,7 +63,7 @@ void FaultDomainGet::ExecuteInternal(std::shared_ptr<Input> /*input*/,
         auto result = GetOutputStructure();
         auto plugin = HostCtl::MeskPluginFactory::GetMeskPlugin();
         auto info = plugin->GetMeskInfo();
-        result->SetField("faultDomainName", MetaString::New(info->GetFaultDomainName()),
+        result->SetField(kFaultDomainName.name, MetaString::New(info->GetFaultDomainName()),
                          MetaStruct::_docEmpty);
         // A host outside any cluster has no fault domain identifier; it is not asked for then,
         // and the field stays empty.
@@ -61,7 +71,7 @@ void FaultDomainGet::ExecuteInternal(std::shared_ptr<Input> /*input*/,
         if (info->GetClusterConfig().enabled) {
             id = ZuvCtl::Mesk::MeskUtil::GetFaultDomainId();
         }
-        result->SetField("faultDomainId", MetaString::New(id), MetaStruct::_docEmpty);
+        result->SetField(kFaultDomainId.name, MetaString::New(id), MetaStruct::_docEmpty);
         output->SetRootObject(result);
         output->SetComplete();
     } catch (const MeskCtlException& e) {

@@ -5,6 +5,7 @@
 #include <vector>
 
 #include "MeskConstants.h"
+#include "commands/common/OutputFields.h"
 #include "hostctl/MeskCtlException.h"
 #include "hostctl/MeskInfo.h"
 #include "hostctl/MeskPlugin.h"
@@ -19,10 +20,34 @@ using Kalmor::CallSpec::Input;
 using Kalmor::CallSpec::InputSpec;
 using Kalmor::CallSpec::Output;
 using Kalmor::CallSpec::OutputSpec;
+using Kalmor::MetaObj::META_INT;
+using Kalmor::MetaObj::META_STRING;
 using Kalmor::MetaObj::MetaInt;
 using Kalmor::MetaObj::MetaList;
 using Kalmor::MetaObj::MetaString;
 using Kalmor::MetaObj::MetaStruct;
+
+namespace {
+
+// An interface's fields, in the order shown; ExecuteInternal fills them by these names.
+constexpr OutputField kZuvNicName{"ZuvNic Name", META_STRING};
+constexpr OutputField kIpProtocol{"IP Protocol", META_STRING};
+constexpr OutputField kInterfaceUuid{"Interface UUID", META_STRING};
+constexpr OutputField kAgentGroupAddress{"Agent Group Multicast Address", META_STRING};
+constexpr OutputField kAgentGroupV6Address{"Agent Group IPv6 Multicast Address", META_STRING};
+constexpr OutputField kAgentGroupPort{"Agent Group Multicast Port", META_INT};
+constexpr OutputField kMasterGroupAddress{"Master Group Multicast Address", META_STRING};
+constexpr OutputField kMasterGroupV6Address{"Master Group IPv6 Multicast Address", META_STRING};
+constexpr OutputField kMasterGroupPort{"Master Group Multicast Port", META_INT};
+constexpr OutputField kUnicastPort{"Host Unicast Channel Bound Port", META_INT};
+constexpr OutputField kMulticastTtl{"Multicast TTL", META_INT};
+constexpr OutputField kTrafficType{"Traffic Type", META_STRING};
+constexpr OutputField kFields[] = {kZuvNicName,         kIpProtocol,           kInterfaceUuid,
+                                   kAgentGroupAddress,  kAgentGroupV6Address,  kAgentGroupPort,
+                                   kMasterGroupAddress, kMasterGroupV6Address, kMasterGroupPort,
+                                   kUnicastPort,        kMulticastTtl,         kTrafficType};
+
+}  // namespace
 
 std::shared_ptr<NetworkList> NetworkList::New() {
     return std::make_shared<NetworkList>();
@@ -33,12 +58,7 @@ NetworkList::NetworkList() {
     SetMetaDataField("type", "fetcher");
     SetDefaultOutputFormatter("simple");
     SetDefaultOutputParameter("header:MeskNetworkList", "Interface");
-    SetDefaultOutputParameter(
-        "fields:MeskNetworkList",
-        "ZuvNic Name,IP Protocol,Interface UUID,Agent Group Multicast Address,Agent Group IPv6 "
-        "Multicast Address,Agent Group Multicast Port,Master Group Multicast Address,Master "
-        "Group IPv6 Multicast Address,Master Group Multicast Port,Host Unicast Channel Bound "
-        "Port,Multicast TTL,Traffic Type");
+    SetDefaultOutputParameter("fields:MeskNetworkList", JoinFieldNames(kFields));
 }
 
 NetworkList::~NetworkList() = default;
@@ -55,20 +75,7 @@ std::shared_ptr<OutputSpec> NetworkList::GetOutputSpecInternal() {
 
 std::shared_ptr<MetaStruct> NetworkList::GetOutputStructure() {
     auto structure = MetaStruct::New("MeskNetworkList");
-    structure->SetField("ZuvNic Name", MetaString::New(), MetaStruct::_docEmpty);
-    structure->SetField("IP Protocol", MetaString::New(), MetaStruct::_docEmpty);
-    structure->SetField("Interface UUID", MetaString::New(), MetaStruct::_docEmpty);
-    structure->SetField("Agent Group Multicast Address", MetaString::New(), MetaStruct::_docEmpty);
-    structure->SetField("Agent Group IPv6 Multicast Address", MetaString::New(),
-                        MetaStruct::_docEmpty);
-    structure->SetField("Agent Group Multicast Port", MetaInt::New(), MetaStruct::_docEmpty);
-    structure->SetField("Master Group Multicast Address", MetaString::New(), MetaStruct::_docEmpty);
-    structure->SetField("Master Group IPv6 Multicast Address", MetaString::New(),
-                        MetaStruct::_docEmpty);
-    structure->SetField("Master Group Multicast Port", MetaInt::New(), MetaStruct::_docEmpty);
-    structure->SetField("Host Unicast Channel Bound Port", MetaInt::New(), MetaStruct::_docEmpty);
-    structure->SetField("Multicast TTL", MetaInt::New(), MetaStruct::_docEmpty);
-    structure->SetField("Traffic Type", MetaString::New(), MetaStruct::_docEmpty);
+    AddEmptyFields(*structure, kFields);
     return structure;
 }
 
@@ -86,35 +93,35 @@ void NetworkList::ExecuteInternal(std::shared_ptr<Input> /*input*/,
         auto configs = info2->GetZuvNicConfigs();
         for (const auto& config : configs) {
             auto entry = GetOutputStructure();
-            entry->SetField("ZuvNic Name", MetaString::New(config->GetZuvnicName()),
+            entry->SetField(kZuvNicName.name, MetaString::New(config->GetZuvnicName()),
                             MetaStruct::_docEmpty);
             // Every interface is an IP interface, whichever kind its groups are.
-            entry->SetField("IP Protocol", MetaString::New("IP"), MetaStruct::_docEmpty);
-            entry->SetField("Interface UUID", MetaString::New(config->GetIfaceUuid()),
+            entry->SetField(kIpProtocol.name, MetaString::New("IP"), MetaStruct::_docEmpty);
+            entry->SetField(kInterfaceUuid.name, MetaString::New(config->GetIfaceUuid()),
                             MetaStruct::_docEmpty);
-            entry->SetField("Agent Group Multicast Address",
+            entry->SetField(kAgentGroupAddress.name,
                             MetaString::New(config->GetAgentMulticastGroup().GetStringAddress()),
                             MetaStruct::_docEmpty);
-            entry->SetField("Agent Group IPv6 Multicast Address",
+            entry->SetField(kAgentGroupV6Address.name,
                             MetaString::New(config->GetAgentV6MulticastGroup().GetStringAddress()),
                             MetaStruct::_docEmpty);
-            entry->SetField("Agent Group Multicast Port",
-                            MetaInt::New(config->GetAgentMulticastPort()), MetaStruct::_docEmpty);
-            entry->SetField("Master Group Multicast Address",
+            entry->SetField(kAgentGroupPort.name, MetaInt::New(config->GetAgentMulticastPort()),
+                            MetaStruct::_docEmpty);
+            entry->SetField(kMasterGroupAddress.name,
                             MetaString::New(config->GetMasterMulticastGroup().GetStringAddress()),
                             MetaStruct::_docEmpty);
-            entry->SetField("Master Group IPv6 Multicast Address",
+            entry->SetField(kMasterGroupV6Address.name,
                             MetaString::New(config->GetMasterV6MulticastGroup().GetStringAddress()),
                             MetaStruct::_docEmpty);
-            entry->SetField("Master Group Multicast Port",
-                            MetaInt::New(config->GetMasterMulticastPort()), MetaStruct::_docEmpty);
-            entry->SetField("Host Unicast Channel Bound Port",
-                            MetaInt::New(config->GetHostUnicastPort()), MetaStruct::_docEmpty);
-            entry->SetField("Multicast TTL", MetaInt::New(config->GetMulticastTTL()),
+            entry->SetField(kMasterGroupPort.name, MetaInt::New(config->GetMasterMulticastPort()),
+                            MetaStruct::_docEmpty);
+            entry->SetField(kUnicastPort.name, MetaInt::New(config->GetHostUnicastPort()),
+                            MetaStruct::_docEmpty);
+            entry->SetField(kMulticastTtl.name, MetaInt::New(config->GetMulticastTTL()),
                             MetaStruct::_docEmpty);
             std::vector<std::string> types;
             config->GetTrafficTypes(types);
-            entry->SetField("Traffic Type", MetaString::New(boost::algorithm::join(types, ", ")),
+            entry->SetField(kTrafficType.name, MetaString::New(boost::algorithm::join(types, ", ")),
                             MetaStruct::_docEmpty);
             list->Add(entry);
         }

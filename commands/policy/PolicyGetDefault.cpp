@@ -4,6 +4,7 @@
 #include <vector>
 
 #include "MeskConstants.h"
+#include "commands/common/OutputFields.h"
 #include "hostctl/MeskCtlException.h"
 #include "hostctl/MeskPlugin.h"
 #include "hostctl/MeskUtil.h"
@@ -19,12 +20,18 @@ using Kalmor::CallSpec::Output;
 using Kalmor::CallSpec::OutputSpec;
 using Kalmor::CallSpec::ParameterConstraint;
 using Kalmor::CallSpec::ParameterSpec;
+using Kalmor::MetaObj::META_STRING;
 using Kalmor::MetaObj::MetaList;
 using Kalmor::MetaObj::MetaString;
 using Kalmor::MetaObj::MetaStruct;
 using ZuvCtl::Mesk::MeskUtil;
 
 namespace {
+
+// A row's fields, in the order shown; ExecuteInternal fills them by these names.
+constexpr OutputField kPolicyClass{"Policy Class", META_STRING};
+constexpr OutputField kPolicyValue{"Policy Value", META_STRING};
+constexpr OutputField kFields[] = {kPolicyClass, kPolicyValue};
 
 // The policy class names the user may give, each allowed value described by itself.
 std::shared_ptr<ParameterConstraint> PolicyClassConstraint() {
@@ -45,7 +52,7 @@ PolicyGetDefault::PolicyGetDefault() {
     SetDescription("Get default Mesk storage policy values.");
     SetMetaDataField("type", "fetcher");
     SetDefaultOutputFormatter("table");
-    SetDefaultOutputParameter("fields:Policy", "Policy Class,Policy Value");
+    SetDefaultOutputParameter("fields:Policy", JoinFieldNames(kFields));
 }
 
 PolicyGetDefault::~PolicyGetDefault() = default;
@@ -73,8 +80,7 @@ std::shared_ptr<OutputSpec> PolicyGetDefault::GetOutputSpecInternal() {
 
 std::shared_ptr<MetaStruct> PolicyGetDefault::GetOutputStructure() {
     auto structure = MetaStruct::New("Policy");
-    structure->SetField("Policy Class", MetaString::New(), MetaStruct::_docEmpty);
-    structure->SetField("Policy Value", MetaString::New(), MetaStruct::_docEmpty);
+    AddEmptyFields(*structure, kFields);
     return structure;
 }
 
@@ -103,8 +109,8 @@ void PolicyGetDefault::ExecuteInternal(std::shared_ptr<Input> input,
             try {
                 const std::string value = info->GetDefaultPolicy(name);
                 auto row = GetOutputStructure();
-                row->SetField("Policy Class", MetaString::New(name), MetaStruct::_docEmpty);
-                row->SetField("Policy Value", MetaString::New(value), MetaStruct::_docEmpty);
+                row->SetField(kPolicyClass.name, MetaString::New(name), MetaStruct::_docEmpty);
+                row->SetField(kPolicyValue.name, MetaString::New(value), MetaStruct::_docEmpty);
                 result->Add(row);
             } catch (const MeskCtlException&) {
                 // A class whose default cannot be read is left out of the table without a

@@ -1,6 +1,7 @@
 #include "commands/resync/ResyncBandwidthGet.h"
 
 #include "MeskConstants.h"
+#include "commands/common/OutputFields.h"
 #include "hostctl/MeskCtlException.h"
 #include "hostctl/MeskPlugin.h"
 
@@ -12,8 +13,17 @@ using Kalmor::CallSpec::Input;
 using Kalmor::CallSpec::InputSpec;
 using Kalmor::CallSpec::Output;
 using Kalmor::CallSpec::OutputSpec;
+using Kalmor::MetaObj::META_INT;
 using Kalmor::MetaObj::MetaInt;
 using Kalmor::MetaObj::MetaStruct;
+
+namespace {
+
+// The result's fields; ExecuteInternal fills them by these names.
+constexpr OutputField kRate{"Rate", META_INT};
+constexpr OutputField kFields[] = {kRate};
+
+}  // namespace
 
 std::shared_ptr<ResyncBandwidthGet> ResyncBandwidthGet::New() {
     return std::make_shared<ResyncBandwidthGet>();
@@ -40,7 +50,7 @@ std::shared_ptr<OutputSpec> ResyncBandwidthGet::GetOutputSpecInternal() {
 
 std::shared_ptr<MetaStruct> ResyncBandwidthGet::GetOutputStructure() {
     auto structure = MetaStruct::New("ResyncBandwidth");
-    structure->SetField("Rate", MetaInt::New(), MetaStruct::_docEmpty);
+    AddEmptyFields(*structure, kFields);
     return structure;
 }
 
@@ -51,7 +61,8 @@ void ResyncBandwidthGet::ExecuteInternal(std::shared_ptr<Input> /*input*/,
         auto result = GetOutputStructure();
         auto plugin = HostCtl::MeskPluginFactory::GetMeskPlugin();
         auto info = plugin->GetMeskInfo();
-        result->SetField("Rate", MetaInt::New(info->GetResyncBandwidth()), MetaStruct::_docEmpty);
+        result->SetField(kRate.name, MetaInt::New(info->GetResyncBandwidth()),
+                         MetaStruct::_docEmpty);
         output->SetRootObject(result);
     } catch (const MeskCtlException& e) {
         output->AddErrorMessage(e.GetMessage());

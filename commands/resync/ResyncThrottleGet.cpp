@@ -1,6 +1,7 @@
 #include "commands/resync/ResyncThrottleGet.h"
 
 #include "MeskConstants.h"
+#include "commands/common/OutputFields.h"
 #include "hostctl/MeskCtlException.h"
 #include "hostctl/MeskPlugin.h"
 
@@ -12,8 +13,17 @@ using Kalmor::CallSpec::Input;
 using Kalmor::CallSpec::InputSpec;
 using Kalmor::CallSpec::Output;
 using Kalmor::CallSpec::OutputSpec;
+using Kalmor::MetaObj::META_INT;
 using Kalmor::MetaObj::MetaInt;
 using Kalmor::MetaObj::MetaStruct;
+
+namespace {
+
+// The result's fields; ExecuteInternal fills them by these names.
+constexpr OutputField kLevel{"Level", META_INT};
+constexpr OutputField kFields[] = {kLevel};
+
+}  // namespace
 
 std::shared_ptr<ResyncThrottleGet> ResyncThrottleGet::New() {
     return std::make_shared<ResyncThrottleGet>();
@@ -38,7 +48,7 @@ std::shared_ptr<OutputSpec> ResyncThrottleGet::GetOutputSpecInternal() {
 
 std::shared_ptr<MetaStruct> ResyncThrottleGet::GetOutputStructure() {
     auto structure = MetaStruct::New("ResyncThrottle");
-    structure->SetField("Level", MetaInt::New(), MetaStruct::_docEmpty);
+    AddEmptyFields(*structure, kFields);
     return structure;
 }
 
@@ -49,7 +59,8 @@ void ResyncThrottleGet::ExecuteInternal(std::shared_ptr<Input> /*input*/,
         auto result = GetOutputStructure();
         auto plugin = HostCtl::MeskPluginFactory::GetMeskPlugin();
         auto info = plugin->GetMeskInfo();
-        result->SetField("Level", MetaInt::New(info->GetResyncThrottle()), MetaStruct::_docEmpty);
+        result->SetField(kLevel.name, MetaInt::New(info->GetResyncThrottle()),
+                         MetaStruct::_docEmpty);
         output->SetRootObject(result);
     } catch (const MeskCtlException& e) {
         output->AddErrorMessage(e.GetMessage());

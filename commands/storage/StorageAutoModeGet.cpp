@@ -1,6 +1,7 @@
 #include "commands/storage/StorageAutoModeGet.h"
 
 #include "MeskConstants.h"
+#include "commands/common/OutputFields.h"
 #include "hostctl/MeskCtlException.h"
 #include "hostctl/MeskPlugin.h"
 
@@ -12,8 +13,17 @@ using Kalmor::CallSpec::Input;
 using Kalmor::CallSpec::InputSpec;
 using Kalmor::CallSpec::Output;
 using Kalmor::CallSpec::OutputSpec;
+using Kalmor::MetaObj::META_BOOL;
 using Kalmor::MetaObj::MetaBool;
 using Kalmor::MetaObj::MetaStruct;
+
+namespace {
+
+// The result's fields; ExecuteInternal fills them by these names.
+constexpr OutputField kEnabled{"Enabled", META_BOOL};
+constexpr OutputField kFields[] = {kEnabled};
+
+}  // namespace
 
 std::shared_ptr<StorageAutoModeGet> StorageAutoModeGet::New() {
     return std::make_shared<StorageAutoModeGet>();
@@ -40,7 +50,7 @@ std::shared_ptr<OutputSpec> StorageAutoModeGet::GetOutputSpecInternal() {
 
 std::shared_ptr<MetaStruct> StorageAutoModeGet::GetOutputStructure() {
     auto structure = MetaStruct::New("AutoMode");
-    structure->SetField("Enabled", MetaBool::New(), MetaStruct::_docEmpty);
+    AddEmptyFields(*structure, kFields);
     return structure;
 }
 
@@ -50,7 +60,8 @@ void StorageAutoModeGet::ExecuteInternal(std::shared_ptr<Input> /*input*/,
         auto result = GetOutputStructure();
         auto plugin = HostCtl::MeskPluginFactory::GetMeskPlugin();
         auto info = plugin->GetMeskInfo();
-        result->SetField("Enabled", MetaBool::New(info->GetAutoClaimMode()), MetaStruct::_docEmpty);
+        result->SetField(kEnabled.name, MetaBool::New(info->GetAutoClaimMode()),
+                         MetaStruct::_docEmpty);
         output->SetRootObject(result);
         output->SetComplete();
     } catch (const MeskCtlException& e) {

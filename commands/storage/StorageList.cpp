@@ -5,6 +5,7 @@
 #include <vector>
 
 #include "MeskConstants.h"
+#include "commands/common/OutputFields.h"
 #include "hostctl/MeskCtlException.h"
 #include "hostctl/MeskInfo.h"
 #include "hostctl/MeskPlugin.h"
@@ -23,11 +24,40 @@ using Kalmor::CallSpec::InputSpec;
 using Kalmor::CallSpec::Output;
 using Kalmor::CallSpec::OutputSpec;
 using Kalmor::CallSpec::ParameterSpec;
+using Kalmor::MetaObj::META_BOOL;
+using Kalmor::MetaObj::META_STRING;
 using Kalmor::MetaObj::MetaBool;
 using Kalmor::MetaObj::MetaList;
 using Kalmor::MetaObj::MetaString;
 using Kalmor::MetaObj::MetaStruct;
 using ZuvCtl::Mesk::MeskUtil;
+
+namespace {
+
+// A disk's fields, in the order shown; ExecuteInternal fills them by these names.
+constexpr OutputField kDevice{"Device", META_STRING};
+constexpr OutputField kDisplayName{"Display Name", META_STRING};
+constexpr OutputField kIsSsd{"Is SSD", META_BOOL};
+constexpr OutputField kMeskUuid{"MESK UUID", META_STRING};
+constexpr OutputField kDiskGroupUuid{"MESK Disk Group UUID", META_STRING};
+constexpr OutputField kDiskGroupName{"MESK Disk Group Name", META_STRING};
+constexpr OutputField kUsedByThisHost{"Used by this host", META_BOOL};
+constexpr OutputField kInKovra{"In KOVRA", META_BOOL};
+constexpr OutputField kFormatVersion{"On-disk format version", META_STRING};
+constexpr OutputField kDeduplication{"Deduplication", META_BOOL};
+constexpr OutputField kCompression{"Compression", META_BOOL};
+constexpr OutputField kChecksum{"Checksum", META_STRING};
+constexpr OutputField kChecksumOk{"Checksum OK", META_BOOL};
+constexpr OutputField kIsCapacityTier{"Is Capacity Tier", META_BOOL};
+constexpr OutputField kEncryption{"Encryption", META_BOOL};
+constexpr OutputField kDiskKeyLoaded{"DiskKeyLoaded", META_BOOL};
+constexpr OutputField kFields[] = {
+    kDevice,        kDisplayName,    kIsSsd,          kMeskUuid,
+    kDiskGroupUuid, kDiskGroupName,  kUsedByThisHost, kInKovra,
+    kFormatVersion, kDeduplication,  kCompression,    kChecksum,
+    kChecksumOk,    kIsCapacityTier, kEncryption,     kDiskKeyLoaded};
+
+}  // namespace
 
 std::shared_ptr<StorageList> StorageList::New() {
     return std::make_shared<StorageList>();
@@ -38,11 +68,7 @@ StorageList::StorageList() {
     SetMetaDataField("type", "fetcher");
     SetDefaultOutputFormatter("simple");
     SetDefaultOutputParameter("header:MeskStorageList", "%Device%");
-    SetDefaultOutputParameter(
-        "fields:MeskStorageList",
-        "Device,Display Name,Is SSD,MESK UUID,MESK Disk Group UUID,MESK Disk Group Name,Used by "
-        "this host,In KOVRA,On-disk format version,Deduplication,Compression,Checksum,Checksum "
-        "OK,Is Capacity Tier,Encryption,DiskKeyLoaded");
+    SetDefaultOutputParameter("fields:MeskStorageList", JoinFieldNames(kFields));
 }
 
 StorageList::~StorageList() = default;
@@ -76,22 +102,7 @@ std::shared_ptr<OutputSpec> StorageList::GetOutputSpecInternal() {
 
 std::shared_ptr<MetaStruct> StorageList::GetOutputStructure() {
     auto structure = MetaStruct::New("MeskStorageList");
-    structure->SetField("Device", MetaString::New(), MetaStruct::_docEmpty);
-    structure->SetField("Display Name", MetaString::New(), MetaStruct::_docEmpty);
-    structure->SetField("Is SSD", MetaBool::New(), MetaStruct::_docEmpty);
-    structure->SetField("MESK UUID", MetaString::New(), MetaStruct::_docEmpty);
-    structure->SetField("MESK Disk Group UUID", MetaString::New(), MetaStruct::_docEmpty);
-    structure->SetField("MESK Disk Group Name", MetaString::New(), MetaStruct::_docEmpty);
-    structure->SetField("Used by this host", MetaBool::New(), MetaStruct::_docEmpty);
-    structure->SetField("In KOVRA", MetaBool::New(), MetaStruct::_docEmpty);
-    structure->SetField("On-disk format version", MetaString::New(), MetaStruct::_docEmpty);
-    structure->SetField("Deduplication", MetaBool::New(), MetaStruct::_docEmpty);
-    structure->SetField("Compression", MetaBool::New(), MetaStruct::_docEmpty);
-    structure->SetField("Checksum", MetaString::New(), MetaStruct::_docEmpty);
-    structure->SetField("Checksum OK", MetaBool::New(), MetaStruct::_docEmpty);
-    structure->SetField("Is Capacity Tier", MetaBool::New(), MetaStruct::_docEmpty);
-    structure->SetField("Encryption", MetaBool::New(), MetaStruct::_docEmpty);
-    structure->SetField("DiskKeyLoaded", MetaBool::New(), MetaStruct::_docEmpty);
+    AddEmptyFields(*structure, kFields);
     return structure;
 }
 
@@ -164,27 +175,27 @@ void StorageList::ExecuteInternal(std::shared_ptr<Input> input, std::shared_ptr<
             // The record holds one name and one deduplication flag; each shows under two fields.
             auto name = MetaString::New(disk.name);
             auto deduplication = MetaBool::New(disk.deduplication);
-            row->SetField("Device", name, MetaStruct::_docEmpty);
-            row->SetField("Display Name", name, MetaStruct::_docEmpty);
-            row->SetField("Is SSD", MetaBool::New(disk.isSsd), MetaStruct::_docEmpty);
-            row->SetField("MESK UUID", MetaString::New(disk.meskUuid), MetaStruct::_docEmpty);
-            row->SetField("MESK Disk Group UUID", MetaString::New(disk.diskGroupUuid),
+            row->SetField(kDevice.name, name, MetaStruct::_docEmpty);
+            row->SetField(kDisplayName.name, name, MetaStruct::_docEmpty);
+            row->SetField(kIsSsd.name, MetaBool::New(disk.isSsd), MetaStruct::_docEmpty);
+            row->SetField(kMeskUuid.name, MetaString::New(disk.meskUuid), MetaStruct::_docEmpty);
+            row->SetField(kDiskGroupUuid.name, MetaString::New(disk.diskGroupUuid),
                           MetaStruct::_docEmpty);
-            row->SetField("MESK Disk Group Name", MetaString::New(disk.diskGroupName),
+            row->SetField(kDiskGroupName.name, MetaString::New(disk.diskGroupName),
                           MetaStruct::_docEmpty);
-            row->SetField("Used by this host", MetaBool::New(disk.usedByThisHost),
+            row->SetField(kUsedByThisHost.name, MetaBool::New(disk.usedByThisHost),
                           MetaStruct::_docEmpty);
-            row->SetField("In KOVRA", MetaBool::New(disk.inKovra), MetaStruct::_docEmpty);
-            row->SetField("On-disk format version", MarshalVersion(disk.formatVersion),
+            row->SetField(kInKovra.name, MetaBool::New(disk.inKovra), MetaStruct::_docEmpty);
+            row->SetField(kFormatVersion.name, MarshalVersion(disk.formatVersion),
                           MetaStruct::_docEmpty);
-            row->SetField("Deduplication", deduplication, MetaStruct::_docEmpty);
-            row->SetField("Compression", deduplication, MetaStruct::_docEmpty);
-            row->SetField("Checksum", MetaString::New(disk.checksum), MetaStruct::_docEmpty);
-            row->SetField("Checksum OK", MetaBool::New(disk.checksumOk), MetaStruct::_docEmpty);
-            row->SetField("Is Capacity Tier", MetaBool::New(disk.isCapacityTier),
+            row->SetField(kDeduplication.name, deduplication, MetaStruct::_docEmpty);
+            row->SetField(kCompression.name, deduplication, MetaStruct::_docEmpty);
+            row->SetField(kChecksum.name, MetaString::New(disk.checksum), MetaStruct::_docEmpty);
+            row->SetField(kChecksumOk.name, MetaBool::New(disk.checksumOk), MetaStruct::_docEmpty);
+            row->SetField(kIsCapacityTier.name, MetaBool::New(disk.isCapacityTier),
                           MetaStruct::_docEmpty);
-            row->SetField("Encryption", MetaBool::New(disk.encryption), MetaStruct::_docEmpty);
-            row->SetField("DiskKeyLoaded", MetaBool::New(disk.diskKeyLoaded),
+            row->SetField(kEncryption.name, MetaBool::New(disk.encryption), MetaStruct::_docEmpty);
+            row->SetField(kDiskKeyLoaded.name, MetaBool::New(disk.diskKeyLoaded),
                           MetaStruct::_docEmpty);
             result->Add(row);
         }

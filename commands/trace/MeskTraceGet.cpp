@@ -1,9 +1,11 @@
 #include "commands/trace/MeskTraceGet.h"
 
 #include <fstream>
+#include <string>
 
 #include "MeskConstants.h"
 #include "commands/common/HostPath.h"
+#include "commands/common/OutputFields.h"
 #include "commands/trace/TraceConfigFile.h"
 #include "hostctl/MeskCtlException.h"
 #include "hostctl/MeskUtil.h"
@@ -16,11 +18,25 @@ using Kalmor::CallSpec::Input;
 using Kalmor::CallSpec::InputSpec;
 using Kalmor::CallSpec::Output;
 using Kalmor::CallSpec::OutputSpec;
+using Kalmor::MetaObj::META_BOOL;
+using Kalmor::MetaObj::META_INT;
+using Kalmor::MetaObj::META_STRING;
 using Kalmor::MetaObj::MetaBool;
 using Kalmor::MetaObj::MetaInt;
 using Kalmor::MetaObj::MetaString;
 using Kalmor::MetaObj::MetaStruct;
 using ZuvCtl::Mesk::MeskUtil;
+
+namespace {
+
+// The configuration's fields, in the order shown; ExecuteInternal fills them by these names.
+constexpr OutputField kDirectory{"MESK Traces Directory", META_STRING};
+constexpr OutputField kFilesToRotate{"Number Of Files To Rotate", META_INT};
+constexpr OutputField kMaxFileSize{"Maximum Trace File Size", META_INT};
+constexpr OutputField kLogUrgentToSyslog{"Log Urgent Traces To Syslog", META_BOOL};
+constexpr OutputField kFields[] = {kDirectory, kFilesToRotate, kMaxFileSize, kLogUrgentToSyslog};
+
+}  // namespace
 
 std::shared_ptr<MeskTraceGet> MeskTraceGet::New() {
     return std::make_shared<MeskTraceGet>();
@@ -30,10 +46,8 @@ std::shared_ptr<MeskTraceGet> MeskTraceGet::New() {
 MeskTraceGet::MeskTraceGet() {
     SetDescription("Get the Mesk tracing configuration.");
     SetDefaultOutputFormatter("simple");
-    SetDefaultOutputParameter("fields:MeskTraceGet",
-                              "MESK Traces Directory,Number Of Files To Rotate,"
-                              "Maximum Trace File Size,Log Urgent Traces To Syslog");
-    SetDefaultOutputParameter("units:MeskTraceGet.Maximum Trace File Size", "MB");
+    SetDefaultOutputParameter("fields:MeskTraceGet", JoinFieldNames(kFields));
+    SetDefaultOutputParameter(std::string("units:MeskTraceGet.") + kMaxFileSize.name, "MB");
     SetMetaDataField("type", "fetcher");
 }
 
@@ -51,10 +65,7 @@ std::shared_ptr<OutputSpec> MeskTraceGet::GetOutputSpecInternal() {
 
 std::shared_ptr<MetaStruct> MeskTraceGet::GetOutputStructure() {
     auto structure = MetaStruct::New("MeskTraceGet");
-    structure->SetField("MESK Traces Directory", MetaString::New(), MetaStruct::_docEmpty);
-    structure->SetField("Number Of Files To Rotate", MetaInt::New(), MetaStruct::_docEmpty);
-    structure->SetField("Maximum Trace File Size", MetaInt::New(), MetaStruct::_docEmpty);
-    structure->SetField("Log Urgent Traces To Syslog", MetaBool::New(), MetaStruct::_docEmpty);
+    AddEmptyFields(*structure, kFields);
     return structure;
 }
 
@@ -83,13 +94,10 @@ void MeskTraceGet::ExecuteInternal(std::shared_ptr<Input> /*input*/,
 
     auto result = GetOutputStructure();
     const TraceSettings settings = ReadTraceSettings(file);
-    result->SetField("MESK Traces Directory", MetaString::New(settings.directory),
-                     MetaStruct::_docEmpty);
-    result->SetField("Number Of Files To Rotate", MetaInt::New(settings.maxFiles),
-                     MetaStruct::_docEmpty);
-    result->SetField("Maximum Trace File Size", MetaInt::New(settings.fileSizeMb),
-                     MetaStruct::_docEmpty);
-    result->SetField("Log Urgent Traces To Syslog", MetaBool::New(settings.logUrgentToSyslog),
+    result->SetField(kDirectory.name, MetaString::New(settings.directory), MetaStruct::_docEmpty);
+    result->SetField(kFilesToRotate.name, MetaInt::New(settings.maxFiles), MetaStruct::_docEmpty);
+    result->SetField(kMaxFileSize.name, MetaInt::New(settings.fileSizeMb), MetaStruct::_docEmpty);
+    result->SetField(kLogUrgentToSyslog.name, MetaBool::New(settings.logUrgentToSyslog),
                      MetaStruct::_docEmpty);
     file.close();
     output->SetRootObject(result);

@@ -18,6 +18,31 @@ using ::testing::ReturnRef;
 
 namespace {
 
+// Fails the test unless the result has the shape the command declares: the same kinds and,
+// for structures, the same field names in the same order, so that a row filled under a name
+// missing from the command's declared fields shows up here.
+void ExpectShapedLike(const std::shared_ptr<MetaObject>& declared,
+                      const std::shared_ptr<MetaObject>& result) {
+    ASSERT_TRUE(declared && result && declared->GetType() == result->GetType())
+        << "the result " << Shown(result) << " is not shaped like " << Shown(declared);
+    if (auto list = std::dynamic_pointer_cast<MetaList>(result)) {
+        auto declaredList = std::static_pointer_cast<MetaList>(declared);
+        ASSERT_EQ(declaredList->GetElementType(), list->GetElementType());
+        if (!declaredList->GetTemplate()) return;
+        for (const auto& element : list->GetElements()) {
+            ExpectShapedLike(declaredList->GetTemplate(), element);
+        }
+    } else if (auto structure = std::dynamic_pointer_cast<MetaStruct>(result)) {
+        auto shape = [](const MetaStruct& s) {
+            std::string text;
+            for (const auto& f : s.GetFields())
+                text += f.name + ':' + std::to_string(f.value->GetType()) + ',';
+            return text;
+        };
+        EXPECT_EQ(shape(*std::static_pointer_cast<MetaStruct>(declared)), shape(*structure));
+    }
+}
+
 // Forwards every operation to the test's mock; counts its own release.
 template <class Base>
 class InfoForward : public Base {
@@ -152,6 +177,9 @@ std::shared_ptr<Kalmor::CallSpec::Output> HostTest::Run(Kalmor::AutoCli::Command
     }
     auto output = Kalmor::CallSpec::Output::New();
     command.ExecuteInternal(input, output);
+    if (output->GetRootObject()) {
+        ExpectShapedLike(command.GetOutputSpecInternal()->GetRootObject(), output->GetRootObject());
+    }
     return output;
 }
 
