@@ -119,11 +119,16 @@ class KALMOR_API Input {
 
     // Accessors used by commands. For a parameter that was not given, GetParameter returns
     // the empty text, GetParameterInt 0, GetParameterBool false, GetParameterList nothing.
+    // GetParameter of a list parameter returns its first value.
     std::string GetParameter(const std::string& name) const;
     int64_t GetParameterInt(const std::string& name) const;
+    // Returns true iff the value is "true" or "1".
     bool GetParameterBool(const std::string& name) const;
+    // Replaces `values` with the parameter's values, in the order given.
     void GetParameterList(const std::string& name, std::vector<std::string>& values) const;
+    // Returns true iff the parameter was given, with or without a value.
     bool HasParameter(const std::string& name) const;
+    // Returns true iff the flag was given.
     bool IsFlagSet(const std::string& name) const;
 
     // Filling, used by the framework's parser and by tests. SetParameter replaces any
@@ -146,10 +151,14 @@ class KALMOR_API Output {
     static std::shared_ptr<Output> New();
     virtual ~Output();
 
+    // Sets the result. The framework shows a result that is set, error messages or not.
     void SetRootObject(std::shared_ptr<MetaObj::MetaObject> root);
+    // Adds a message for the user; an invocation with any message has failed (exit status 1).
     void AddErrorMessage(const std::string& message);
+    // Marks the result as all that the command has to hand back.
     void SetComplete();
 
+    // The result, or nullptr when none was set.
     const std::shared_ptr<MetaObj::MetaObject>& GetRootObject() const { return root_; }
     const std::vector<std::string>& GetErrorMessages() const { return errors_; }
     bool IsComplete() const { return complete_; }

@@ -15,44 +15,53 @@ namespace Mesk {
 
 class HOSTCTL_API MeskUtil {
   public:
-    // Fills the host's membership view from the cluster directory service.
+    // Fills the host's membership view from the cluster directory service: the members, this
+    // node's state, UUID and health, the membership entry's revision and UUID, the master's
+    // and the backup's UUIDs and the maintenance mode state. Pass empty values.
     static void GetInfoFromKOVRA(std::vector<HostCtl::Mesk::MeskMemberInfo>& members,
                                  std::string& localNodeState, std::string& localNodeUuid,
                                  std::string& localNodeHealthState,
                                  uint64_t& membershipEntryRevision, std::string& membershipUuid,
                                  std::string& masterUuid, std::string& backupUuid,
                                  std::string& maintenanceModeState);
+    // Sets `unicast` to true iff the cluster runs in unicast mode.
     static void GetUnicastMode(bool& unicast);
-    // The host's current local date and time.
+    // Returns the host's current local date and time as text.
     static std::string GetFormattedSystemDateTime();
 
     // Converts UUID text ("nnnnnnnn-nnnn-nnnn-nnnn-nnnnnnnnnnnn", hexadecimal digits in either
     // case) to the record; throws MeskCtlException for any other text.
     static HostCtl::Mesk::Uuid StringToMeskUuid(const std::string& text);
-    // The record's text form, in lower case.
+    // Returns the record's text form, in lower case.
     static std::string MeskUuidToString(const HostCtl::Mesk::Uuid& uuid);
-    // The number of characters (not bytes) of UTF-8 text.
+    // Returns the number of characters (not bytes) of UTF-8 text.
     static size_t UTF8StringCharLength(const std::string& text);
 
+    // Returns true iff the host's cluster is a stretched cluster.
     static bool IsInStretchedCluster();
-    // The stretched cluster's preferred fault domain.
+    // Sets `id` and `name` to the stretched cluster's preferred fault domain; throws
+    // MeskCtlException outside a stretched cluster.
     static void GetPreferredFaultDomainInfo(std::string& id, std::string& name);
-    // True iff this host is a witness node.
+    // Returns true iff this host is a witness node.
     static bool IsWitnessNode();
-    // The identifier of the host's fault domain.
+    // Returns the identifier of the host's fault domain.
     static std::string GetFaultDomainId();
     // Cancels the maintenance mode operation in progress.
     static void DecomCancel();
 
+    // Returns the policy class of that name (exact, case-sensitive); throws MeskCtlException
+    // for any other text.
     static HostCtl::Mesk::MeskPolicyClass StringToMeskPolicyClass(const std::string& name);
+    // Returns the policy class's name; throws MeskCtlException for a value that is no class.
     static std::string MeskPolicyClassToString(HostCtl::Mesk::MeskPolicyClass policyClass);
-    // Every policy class, in the library's order.
+    // Returns every policy class, in the library's order.
     static std::vector<HostCtl::Mesk::MeskPolicyClass> GetMeskPolicyClasses();
 
     // Runs a host program with one argument and waits for it. Returns its exit status, or a
-    // negative value when it could not be run or was killed by a signal.
-    static int32_t MeskExec(const std::string& command, const std::string& argument, bool flag1,
-                            bool flag2, bool flag3);
+    // negative value when it could not be run or was killed by a signal. The three flags
+    // mean what the library makes of them; callers pass false, true, false.
+    static int32_t MeskExec(const std::string& command, const std::string& argument,
+                            bool libraryFlag1, bool libraryFlag2, bool libraryFlag3);
 };
 
 }  // namespace Mesk

@@ -46,9 +46,9 @@
     X(std::string, GetFaultDomainId, (), ())                                                       \
     X(void, DecomCancel, (), ())                                                                   \
     X(int32_t, MeskExec,                                                                           \
-      (const std::string& command, const std::string& argument, bool flag1, bool flag2,            \
-       bool flag3),                                                                                \
-      (command, argument, flag1, flag2, flag3))
+      (const std::string& command, const std::string& argument, bool libraryFlag1,                 \
+       bool libraryFlag2, bool libraryFlag3),                                                      \
+      (command, argument, libraryFlag1, libraryFlag2, libraryFlag3))
 
 // The same for the MeskUtil statics that only convert: the backend answers them as the
 // library does (HostCtl.cpp), so a test double need not.
@@ -112,11 +112,11 @@
       (ssd, evacuationMode))                                                                    \
     X(void, RemoveDiskByUuid, (const std::string& uuid, const std::string& evacuationMode),     \
       (uuid, evacuationMode))                                                                   \
-    X(void, MountDiskGroup, (const std::string& ssd, bool flag), (ssd, flag))                   \
+    X(void, MountDiskGroup, (const std::string& ssd, bool serviceFlag), (ssd, serviceFlag))     \
     X(void, MountByUuid, (const std::string& uuid), (uuid))                                     \
     X(void, MountDisk, (const std::string& disk), (disk))                                       \
-    X(void, UnmountDiskGroup, (const std::string& ssd, bool flag), (ssd, flag))                 \
-    X(void, UnmountDisk, (const std::string& disk, bool flag), (disk, flag))                    \
+    X(void, UnmountDiskGroup, (const std::string& ssd, bool serviceFlag), (ssd, serviceFlag))   \
+    X(void, UnmountDisk, (const std::string& disk, bool serviceFlag), (disk, serviceFlag))      \
     X(void, AddCapacityFlashTag, (const std::string& disk), (disk))                             \
     X(void, RemoveCapacityFlashTag, (const std::string& disk), (disk))                          \
     X(bool, GetAutoClaimMode, (), ())                                                           \
