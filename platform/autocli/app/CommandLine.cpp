@@ -70,6 +70,22 @@ std::string CheckFields(CommandSpec& command, const std::vector<std::string>& fi
     return std::string();
 }
 
+// --reference: Markdown, or JSON with the json formatters.
+RunResult Reference(RunResult result, const std::shared_ptr<NamespaceNode>& node,
+                    const std::string& formatter) {
+    if (formatter.empty()) {
+        result.out = RenderReference(node);
+    } else if (formatter == "json" || formatter == "json-pretty") {
+        result.out = RenderReferenceJson(node, formatter == "json-pretty");
+    } else {
+        return UsageError(result, nullptr,
+                          "--reference is Markdown, or JSON with --formatter json or "
+                          "json-pretty; not '" +
+                              MessageText(formatter) + "'");
+    }
+    return result;
+}
+
 RunResult RunCommand(CommandSpec& command, const std::vector<std::string>& words, size_t next,
                      GlobalOptions globals) {
     RunResult result;
@@ -86,8 +102,7 @@ RunResult RunCommand(CommandSpec& command, const std::vector<std::string>& words
         return result;
     }
     if (globals.reference) {
-        result.out = RenderReference(command.GetThis());
-        return result;
+        return Reference(result, command.GetThis(), globals.formatter);
     }
     if (!parsed.error.empty()) {
         return UsageError(result, &command, parsed.error);
@@ -227,8 +242,7 @@ RunResult Dispatch(const std::vector<std::string>& words,
         return result;
     }
     if (globals.reference) {
-        result.out = RenderReference(node);
-        return result;
+        return Reference(result, node, globals.formatter);
     }
     result.out = RenderNamespaceHelp(*node);
     if (node->GetNamespaceNodes().empty()) {

@@ -1,8 +1,11 @@
-// The command reference: the registered tree rendered as one Markdown document.
+// The command reference: the registered tree rendered as one Markdown document, or as JSON
+// with a JSON Schema of each command's json output.
 #include "Reference.h"
 
 #include <map>
 #include <vector>
+
+#include <nlohmann/json.hpp>
 
 #include "Help.h"
 #include "Text.h"
@@ -314,7 +317,145 @@ class ReferenceWriter {
     std::map<std::string, std::string> units_;  // "<StructName>.<Field>" -> unit label
 };
 
+using Json = nlohmann::ordered_json;
+
+const char kSchemaDialect[] = "https://json-schema.org/draft/2020-12/schema";
+
+// The schema of a value as the json formatter prints it (ToJson). A scalar the command left
+// empty is null; a list is an array, empty when there is nothing, and its texts are never
+// null. A structure is an object with exactly its fields: `properties` lists them in the
+// order they are printed, and so does `required`, since every field is always printed.
+Json ValueSchema(const MetaObject* value);
+
+Json ScalarSchema(MetaObj::MetaType type, bool nullable) {
+    const char* name = type == MetaObj::META_INT    ? "integer"
+                       : type == MetaObj::META_BOOL ? "boolean"
+                                                    : "string";
+    return nullable ? Json{{"type", {name, "null"}}} : Json{{"type", name}};
+}
+
+Json StructSchema(const MetaStruct& structure) {
+    Json properties = Json::object();
+    Json required = Json::array();
+    for (const auto& field : structure.GetFields()) {
+        Json schema = ValueSchema(field.value.get());
+        if (!field.documentation.empty()) {
+            schema["description"] = field.documentation;
+        }
+        properties[field.name] = std::move(schema);
+        required.push_back(field.name);
+    }
+    return Json{{"title", structure.GetName()},
+                {"type", "object"},
+                {"properties", std::move(properties)},
+                {"required", std::move(required)},
+                {"additionalProperties", false}};
+}
+
+Json ValueSchema(const MetaObject* value) {
+    if (value == nullptr) {
+        return Json{{"type", "null"}};
+    }
+    switch (value->GetType()) {
+        case MetaObj::META_STRUCT:
+            return StructSchema(static_cast<const MetaStruct&>(*value));
+        case MetaObj::META_LIST: {
+            const auto& list = static_cast<const MetaObj::MetaList&>(*value);
+            Json items;
+            if (list.GetElementType() != MetaObj::META_STRUCT) {
+                items = ScalarSchema(list.GetElementType(), false);
+            } else if (const MetaStruct* element = ElementStruct(value)) {
+                items = StructSchema(*element);
+            } else {
+                items = Json{{"type", "object"}};
+            }
+            return Json{{"type", "array"}, {"items", std::move(items)}};
+        }
+        default:
+            return ScalarSchema(value->GetType(), true);
+    }
+}
+
+Json ParameterJson(const ParameterSpec& parameter) {
+    static const char* const kKinds[] = {"text", "integer", "boolean", "flag", "text"};
+    const auto type = parameter.GetType();
+    Json object{{"name", parameter.GetName()},
+                {"short",
+                 parameter.GetShortName().empty() ? Json(nullptr) : Json(parameter.GetShortName())},
+                {"kind", kKinds[type <= CallSpec::PARAM_STRING_LIST ? type : 0]},
+                {"list", type == CallSpec::PARAM_STRING_LIST},
+                {"required", parameter.IsRequired()}};
+    // The only default the framework itself knows: an absent flag is not set.
+    if (type == CallSpec::PARAM_FLAG) {
+        object["default"] = false;
+    }
+    if (const auto& constraint = parameter.GetConstraint()) {
+        if (constraint->GetType() == CallSpec::CONSTRAINT_STRING_ENUM) {
+            Json values = Json::array();
+            for (const auto& entry : constraint->GetStringEnum()) {
+                values.push_back(entry.value);
+            }
+            object["enum"] = std::move(values);
+        } else if (constraint->GetType() == CallSpec::CONSTRAINT_INT_RANGE) {
+            object["range"] = Json{{"minimum", constraint->GetIntMinimum()},
+                                   {"maximum", constraint->GetIntMaximum()}};
+        }
+    }
+    object["help"] = ExpandEnum(parameter);
+    return object;
+}
+
+Json CommandJson(NamespaceNode& node) {
+    Json object{{"path", node.GetPathString(' ')}, {"description", node.GetDescription()}};
+    auto* command = dynamic_cast<CommandSpec*>(&node);
+    const std::string type = command ? command->GetMetaDataField("type") : std::string();
+    object["type"] = type.empty() ? Json(nullptr) : Json(type);
+    object["defaultFormatter"] = !command || command->GetDefaultOutputFormatter().empty()
+                                     ? Json(nullptr)
+                                     : Json(command->GetDefaultOutputFormatter());
+    Json parameters = Json::array();
+    if (auto input = command ? command->GetInputSpec() : nullptr) {
+        for (const auto& parameter : input->GetParameters()) {
+            if (parameter) {
+                parameters.push_back(ParameterJson(*parameter));
+            }
+        }
+    }
+    object["parameters"] = std::move(parameters);
+    auto output = command ? command->GetOutputSpec() : nullptr;
+    const MetaObject* root = output ? output->GetRootObject().get() : nullptr;
+    if (root == nullptr) {
+        object["output"] = nullptr;  // the command prints nothing
+    } else {
+        Json body = ValueSchema(root);
+        Json schema{{"$schema", kSchemaDialect}};
+        for (auto& member : body.items()) {
+            schema[member.key()] = std::move(member.value());
+        }
+        object["output"] = std::move(schema);
+    }
+    return object;
+}
+
+void CollectCommands(const std::shared_ptr<NamespaceNode>& node, Json& commands) {
+    if (node->GetType() == NodeType::Command) {
+        commands.push_back(CommandJson(*node));
+        return;
+    }
+    for (const auto& child : node->GetNamespaceNodes()) {
+        CollectCommands(child, commands);
+    }
+}
+
 }  // namespace
+
+std::string RenderReferenceJson(const std::shared_ptr<NamespaceNode>& node, bool pretty) {
+    Json commands = Json::array();
+    CollectCommands(node, commands);
+    return Json{{"commands", std::move(commands)}}.dump(pretty ? 2 : -1, ' ', false,
+                                                        nlohmann::json::error_handler_t::replace) +
+           "\n";
+}
 
 std::string RenderReference(const std::shared_ptr<NamespaceNode>& node) {
     return ReferenceWriter().Render(node);

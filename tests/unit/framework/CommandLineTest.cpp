@@ -84,6 +84,18 @@ TEST(CommandLine, StatusStreamsAndWhetherTheCommandRuns) {
          "throw, set, false\n"},
         {"mesk --reference demo", 0, false, "# Command reference: `mesk demo`\n...", ""},
         {"mesk demo get --reference", 0, false, "# Command reference: `mesk demo get`\n...", ""},
+        {"mesk demo set --reference --formatter json", 0, false,
+         R"({"commands":[{"path":"mesk demo set","description":"set","type":null,)"
+         R"("defaultFormatter":null,"parameters":[{"name":"value","short":"v","kind":"integer",)"
+         R"("list":false,"required":true,"help":"The value."}],"output":{"$schema":)"
+         R"("https://json-schema.org/draft/2020-12/schema","title":"Demo","type":"object",)"
+         R"("properties":{"Name":{"type":["string","null"]}},"required":["Name"],)"
+         R"("additionalProperties":false}}]})"
+         "\n",
+         ""},
+        {"--reference --formatter csv", 2, false, "",
+         "autocli: --reference is Markdown, or JSON with --formatter json or json-pretty; not "
+         "'csv'\n"},
         {"--list-commands", 0, false,
          "mesk demo get\nmesk demo fail\nmesk demo throw\nmesk demo set\nmesk demo false\n", ""},
     };
