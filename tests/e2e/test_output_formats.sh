@@ -1,6 +1,7 @@
 #!/bin/bash
 # Every fetcher's result on a populated host: json-pretty has the same fields as json, and csv
 # a header row of the json field names (that each format parses, test_bad_input.sh checks).
+# Their json, and that of a few changes, matches the schema that the JSON reference gives.
 . "$(dirname "$0")/lib.sh"
 
 # A stretched cluster, so that the preferred fault domain can be read too.
@@ -14,11 +15,14 @@ mapfile -t FETCHERS < <("$AUTOCLI" --reference |
     awk '/^## `/ { path = substr($0, 5, length($0) - 5) } /^Type: fetcher/ { print path }')
 expect_eq "$([ "${#FETCHERS[@]}" -ge 10 ] && echo many)" many "fetchers found in the reference"
 
+RESULTS="$E2E_DIR/results"
+mkdir -p "$RESULTS"
 for command in "${FETCHERS[@]}"; do
     case_ "$command in json, json-pretty and csv"
     # shellcheck disable=SC2086
     ok $command --formatter json
     json="$OUT"
+    printf '%s\n' "$json" >"$RESULTS/$command.json"
     # shellcheck disable=SC2086
     run $command --formatter json-pretty
     # The same fields in the same order (values may move on: cluster get tells the time).
@@ -32,6 +36,68 @@ for command in "${FETCHERS[@]}"; do
         expect_eq "${OUT%%$'\n'*}" "$header" "csv header"
     fi
 done
+
+case_ "changes, and a read not marked fetcher, in json"
+for words in "mesk datastore name set --newname scripted" "mesk storage automode set --enabled true" \
+    "mesk cluster unicastagent add -a 10.9.9.9 -p 12321" "mesk cluster unicastagent list" \
+    "mesk cluster leave" "mesk cluster new"; do
+    # shellcheck disable=SC2086
+    ok $words --formatter json
+    printf '%s\n' "$OUT" >"$RESULTS/${words%% -*}.json"
+done
+
+case_ "each json result matches its schema, fields in order; a wrong type or extra field fails"
+"$AUTOCLI" --reference --formatter json >"$E2E_DIR/reference.json"
+_capture python3 - "$E2E_DIR/reference.json" "$RESULTS"/*.json <<'EOF'
+import json, os, sys
+import jsonschema
+
+schemas = {c["path"]: c["output"] for c in json.load(open(sys.argv[1]))["commands"]}
+
+def in_order(doc, schema):  # JSON Schema has no order: "required" lists the fields in order
+    if isinstance(doc, dict):
+        assert list(doc) == schema["required"], f"order {list(doc)}"
+        for key, value in doc.items():
+            in_order(value, schema["properties"][key])
+    elif isinstance(doc, list):
+        for value in doc:
+            in_order(value, schema["items"])
+
+def wrong_type(doc):  # doc with its first scalar of another type, or None
+    if isinstance(doc, (dict, list)):
+        for key, value in (doc.items() if isinstance(doc, dict) else enumerate(doc)):
+            changed = wrong_type(value)
+            if changed is not None:
+                copy = doc.copy()
+                copy[key] = changed
+                return copy
+        return None
+    return None if doc is None else 0 if isinstance(doc, str) else "text"
+
+def extra_field(doc):  # doc with one more field in its first object, or None
+    if isinstance(doc, dict):
+        return {**doc, "Extra": None}
+    return [extra_field(doc[0])] + doc[1:] if isinstance(doc, list) and doc else None
+
+for name in sys.argv[2:]:
+    path = os.path.basename(name)[: -len(".json")]
+    schema = schemas[path]
+    validator = jsonschema.validators.validator_for(schema)
+    assert validator is jsonschema.Draft202012Validator, path
+    validator.check_schema(schema)
+    doc = json.load(open(name))
+    try:
+        validator(schema).validate(doc)
+        in_order(doc, schema)
+        for bad in (wrong_type(doc), extra_field(doc)):
+            if bad is not None and validator(schema).is_valid(bad):
+                print(f"{path}: accepted {json.dumps(bad)[:200]}")
+    except (jsonschema.ValidationError, AssertionError) as error:
+        print(f"{path}: {str(error)[:400]}")
+print(len(sys.argv) - 2, "results")
+EOF
+expect_rc 0
+expect_out "$(ls "$RESULTS" | wc -l) results"
 
 # A result reaches stdout whole, or the run fails: a full device (every path that prints), a
 # non-blocking pipe read slowly, a reader that stops early (SIGPIPE as inherited, or ignored).
