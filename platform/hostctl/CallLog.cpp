@@ -7,6 +7,7 @@
 
 #include <cerrno>
 #include <ctime>
+#include <stdexcept>
 
 namespace HostCtlSim {
 
@@ -22,17 +23,24 @@ int64_t Now() {
 
 // The log file, open and locked (exclusively to write it); -1 when it cannot be had.
 int OpenLocked(const HostRoot& root, bool writing) {
-    std::string path = root.PathOf(kCallLogPath);
-    int flags = (writing ? O_WRONLY | O_CREAT : O_RDONLY) | O_CLOEXEC | O_NOFOLLOW;
-    int fd = open(path.c_str(), flags, 0644);
-    if (fd < 0 && writing && errno == ENOENT) {
-        for (size_t slash = path.find('/', 1); slash != std::string::npos;
-             slash = path.find('/', slash + 1)) {
-            mkdir(path.substr(0, slash).c_str(), 0755);
-        }
-        fd = open(path.c_str(), flags, 0644);
+    std::string hostPath = kCallLogPath;
+    size_t slash = hostPath.rfind('/');
+    int directory = -1;
+    try {
+        directory = root.OpenDirectory(hostPath.substr(0, slash), writing);
+    } catch (const std::runtime_error&) {
+        return -1;  // missing, or another user's
     }
+    int flags = (writing ? O_WRONLY | O_CREAT : O_RDONLY) | O_CLOEXEC | O_NOFOLLOW;
+    int fd = openat(directory, hostPath.c_str() + slash + 1, flags, 0644);
+    close(directory);
     if (fd < 0) return -1;
+    // Made with the mode the log has whatever the umask.
+    struct stat file {};
+    if (writing && fstat(fd, &file) == 0 && file.st_uid == geteuid() &&
+        (file.st_mode & 07777) != 0644) {
+        fchmod(fd, 0644);
+    }
     while (flock(fd, writing ? LOCK_EX : LOCK_SH) != 0) {
         if (errno != EINTR) {
             close(fd);

@@ -76,6 +76,9 @@ int64_t Number(const std::string& text, const char* what, int64_t lowest, int64_
     return value;
 }
 
+// The row of the state that lists the files of the last change still to be put in place.
+const char* const kPendingFiles = "pendingFiles";
+
 struct Host {
     SimHost::Options options = SimHost::OptionsFromEnvironment();
     StateStore store{options.statePath};
@@ -86,39 +89,63 @@ struct Host {
         return store;
     }
 
+    Json Services() { return root.ReadServices(store.ReadExtra(kPendingFiles)); }
+
     Json Document() {
         Json document = Open().Dump();
-        document["services"] = root.ReadServices();
+        document["services"] = Services();
         return document;
+    }
+
+    // Runs `change` as one change of the whole host, files included: under one write
+    // transaction it changes the state and writes the files aside (HostRoot::Files), which
+    // are renamed into place only once the state is committed. A failure before that leaves
+    // state and files as they were. The commit also records the files still to be renamed, so
+    // that `show` reads them and the next change puts them in place when this process is
+    // killed in between.
+    template <class Change>
+    void Modify(Change&& change, bool opened = false) {
+        // A host made here gets its files under the creation lock, before anyone can see it.
+        if (!opened) Open();
+        StateStore::Transaction transaction(store);
+        root.Complete(store.ReadExtra(kPendingFiles));
+        HostRoot::Files files(root);
+        change(files);
+        store.WriteSection(kPendingFiles, files.Pending());
+        transaction.Commit();
+        files.Apply();
     }
 
     // Replaces the whole host by a normalized document; `fresh` also renews the host's files
     // and forgets the injected failures and the call log.
     void Replace(const Json& document, bool fresh) {
         store.OpenForReplacement([&] { root.Create(HostCtlSim::DefaultHost()["services"]); });
-        StateStore::Transaction transaction(store);
-        store.Replace(document);
-        if (fresh) store.ClearFaults();
-        transaction.Commit();
-        if (fresh) {
-            root.Create(document["services"]);
-            HostCtlSim::CallLog::Clear(root);
-        } else {
-            root.WriteServices(document["services"]);
-        }
+        Modify(
+            [&](HostRoot::Files& files) {
+                store.Replace(document);
+                if (fresh) store.ClearFaults();
+                if (fresh) {
+                    for (const auto& file : HostRoot::FreshFiles(document["services"])) {
+                        files.Write(file);
+                    }
+                } else {
+                    files.Write(HostRoot::ServicesFile(document["services"]));
+                }
+            },
+            true);
+        if (fresh) HostCtlSim::CallLog::Clear(root);
     }
 
-    // Applies a JSON merge patch to the whole host. The host is read and written under one
-    // write transaction (its services' file included), so that concurrent merges all land.
+    // Applies a JSON merge patch to the whole host, read and written in one change, so that
+    // concurrent merges all land.
     void Merge(const Json& patch) {
-        Open();
-        StateStore::Transaction transaction(store);
-        Json document = Document();
-        document.merge_patch(patch);
-        document = HostCtlSim::NormalizeHost(document);
-        store.Replace(document);
-        root.WriteServices(document["services"]);
-        transaction.Commit();
+        Modify([&](HostRoot::Files& files) {
+            Json document = Document();
+            document.merge_patch(patch);
+            document = HostCtlSim::NormalizeHost(document);
+            store.Replace(document);
+            files.Write(HostRoot::ServicesFile(document["services"]));
+        });
     }
 };
 
@@ -151,9 +178,7 @@ int Load(const std::vector<std::string>& args) {
 int Fail(const std::vector<std::string>& args) {
     Host host;
     if (args.size() == 1 && args[0] == "--clear") {
-        StateStore::Transaction transaction(host.Open());
-        host.store.ClearFaults();
-        transaction.Commit();
+        host.Modify([&](HostRoot::Files&) { host.store.ClearFaults(); });
         return 0;
     }
     if (args.size() == 1 && args[0] == "--list") {
@@ -184,9 +209,7 @@ int Fail(const std::vector<std::string>& args) {
         }
         throw UsageError("unknown operation '" + fault.op + "'; the operations are: " + known);
     }
-    StateStore::Transaction transaction(host.Open());
-    host.store.SetFault(fault);
-    transaction.Commit();
+    host.Modify([&](HostRoot::Files&) { host.store.SetFault(fault); });
     return 0;
 }
 
@@ -196,7 +219,9 @@ int Calls(const std::vector<std::string>& args) {
         if (!HostCtlSim::CallLog::Clear(root)) {
             throw std::runtime_error("cannot clear " + root.PathOf(HostCtlSim::kCallLogPath));
         }
-        root.ClearScriptLog();
+        HostRoot::Files files(root);
+        files.Write({HostCtlSim::kScriptLogPath, "", 0644});
+        files.Apply();
         return 0;
     }
     if (!args.empty()) throw UsageError("calls takes no argument but --clear");
@@ -220,30 +245,33 @@ int Service(const std::vector<std::string>& args) {
     if (args.size() < 2 || args[0] != "mesktraced") {
         throw UsageError("service takes mesktraced running|stopped|status-fails|restart-fails [N]");
     }
-    Host host;
-    host.Open();
-    Json services = host.root.ReadServices();
-    Json& trace = services["mesktraced"];
     const std::string& mode = args[1];
+    int64_t restartFailures = -1;
     size_t expected = 2;
-    if (mode == "running" || mode == "stopped") {
-        trace["state"] = mode;
-        trace["statusFails"] = false;
-        trace["restartFailures"] = 0;
-    } else if (mode == "status-fails") {
-        trace["statusFails"] = true;
-    } else if (mode == "restart-fails") {
-        trace["restartFailures"] = -1;
-        if (args.size() == 3) {
-            trace["restartFailures"] = Number(args[2], "N", 1, INT32_MAX);
-            expected = 3;
-        }
-    } else {
+    if (mode == "restart-fails" && args.size() == 3) {
+        restartFailures = Number(args[2], "N", 1, INT32_MAX);
+        expected = 3;
+    } else if (mode != "running" && mode != "stopped" && mode != "status-fails" &&
+               mode != "restart-fails") {
         throw UsageError("unknown service behaviour '" + mode +
                          "'; use running, stopped, status-fails or restart-fails [N]");
     }
     if (args.size() != expected) throw UsageError("too many arguments to service");
-    host.root.WriteServices(services);
+    Host host;
+    host.Modify([&](HostRoot::Files& files) {
+        Json services = host.Services();
+        Json& trace = services["mesktraced"];
+        if (mode == "running" || mode == "stopped") {
+            trace["state"] = mode;
+            trace["statusFails"] = false;
+            trace["restartFailures"] = 0;
+        } else if (mode == "status-fails") {
+            trace["statusFails"] = true;
+        } else {
+            trace["restartFailures"] = restartFailures;
+        }
+        files.Write(HostRoot::ServicesFile(services));
+    });
     return 0;
 }
 

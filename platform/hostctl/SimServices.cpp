@@ -4,6 +4,7 @@
 #include <sys/wait.h>
 
 #include <cerrno>
+#include <stdexcept>
 
 #include "SimInfo.h"
 
@@ -17,8 +18,16 @@ int32_t SimHost::MeskExec(const std::string& command, const std::string& argumen
         *this, Operation::MeskExec, Json::array({command, argument, flag1, flag2, flag3}), [&] {
             std::string path = command;
             if (!options_.execRoot.empty()) {
-                path = HostRoot(options_.execRoot)
-                           .PathOf(command.empty() || command[0] != '/' ? "/" + command : command);
+                HostRoot root(options_.execRoot);
+                std::string hostPath =
+                    command.empty() || command[0] != '/' ? "/" + command : command;
+                // A program that another user could have replaced is not run.
+                try {
+                    root.CheckTrusted(hostPath);
+                } catch (const std::runtime_error&) {
+                    return int32_t{-1};
+                }
+                path = root.PathOf(hostPath);
             }
             // The program's output would mix with the command's own; it goes nowhere.
             posix_spawn_file_actions_t actions;

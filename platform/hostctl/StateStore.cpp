@@ -204,6 +204,16 @@ const Json& StateStore::ReadSection(const std::string& name) {
     return sections_[name] = Json::parse(text);
 }
 
+Json StateStore::ReadExtra(const std::string& name) {
+    BeginRead();
+    Use query(Statement("SELECT value FROM section WHERE name = ?1"));
+    Bind(query, 1, name);
+    if (sqlite3_step(query) != SQLITE_ROW) return Json();
+    std::string text;
+    Read(query, 0, text);
+    return Json::parse(text, nullptr, false);
+}
+
 void StateStore::WriteSection(const std::string& name, const Json& value) {
     Use statement(Statement("INSERT OR REPLACE INTO section(name, value) VALUES(?1, ?2)"));
     Bind(statement, 1, name);

@@ -73,6 +73,8 @@ class StateStore {
     // transaction.
     // One top-level key of the document (not "storage.disks" nor "services").
     const Json& ReadSection(const std::string& name);
+    // A row of the section table that is not part of the document, or null when there is none.
+    Json ReadExtra(const std::string& name);
     // Every disk, in inventory order.
     const std::vector<Disk>& Disks();
     // The disk with that UUID (lower case), or nullptr.
@@ -84,8 +86,8 @@ class StateStore {
     std::vector<Fault> ReadFaults();
 
     // Changing, within a Transaction.
-    void WriteSection(const std::string& name, const Json& value);
-    void WriteDisk(const Disk& disk);  // the disk of that UUID
+    void WriteSection(const std::string& name, const Json& value);  // also an extra row
+    void WriteDisk(const Disk& disk);                               // the disk of that UUID
     void DeleteDisk(const std::string& uuid);
     void Replace(const Json& host);  // by a normalized document
     void SetFault(const Fault& fault);
