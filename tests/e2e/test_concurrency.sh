@@ -120,18 +120,26 @@ expect_eq "$final" "$((initial + changes))" "generation after $changes successfu
 echo "$changes of $((8 * ROUNDS)) joins and leaves changed the cluster"
 if [ "$changes" -gt 0 ]; then _pass; else _fail "no process changed the cluster"; fi
 
-case_ "8 hostsim merges of different keys all land"
-# A merge reads the host and writes it back whole; without one transaction around both, a
-# merge overwrote what another had written in between.
+case_ "hostsim merges and services race autocli writers: every change lands"
+# A merge reads the host and writes it back whole, services included, and `hostsim service`
+# rewrites the services; without one transaction around each, one overwrote what another had
+# written in between.
 "$HOSTSIM" reset >/dev/null
+rm -f "$E2E_DIR"/status.*
 for ((n = 0; n < 8; n++)); do
     printf '{"policies": {"class%d": "policy %d"}}' "$n" "$n" >"$E2E_DIR/merge.$n.json"
+    "$HOSTSIM" load --merge "$E2E_DIR/merge.$n.json" &
+    spawn "$n" mesk cluster unicastagent add -t node -U true -a "10.2.0.$n" -p 20000 \
+        -u "$(printf '5c0a9e11-0000-4000-8000-%012d' "$n")"
+    if ((n % 2)); then "$HOSTSIM" service mesktraced status-fails & else
+        "$HOSTSIM" service mesktraced restart-fails 5 &
+    fi
 done
-for ((n = 0; n < 8; n++)); do "$HOSTSIM" load --merge "$E2E_DIR/merge.$n.json" & done
 wait
+expect_eq "$(succeeded 8)" 8 "autocli writers that succeeded"
 sim show
-expect_eq "$(jq -c '[.policies | to_entries[] | select(.key | startswith("class")) | .value] | sort' <<<"$OUT")" \
-    '["policy 0","policy 1","policy 2","policy 3","policy 4","policy 5","policy 6","policy 7"]' \
-    "policies merged"
+expect_eq "$(jq -c '[([.policies | to_entries[] | select(.key | startswith("class"))] | length),
+    (.unicastAgents | length), .services.mesktraced]' <<<"$OUT")" \
+    '[8,8,{"state":"running","statusFails":true,"restartFailures":5}]' "merged policies, agents, service"
 
 finish

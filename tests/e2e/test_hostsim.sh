@@ -157,4 +157,62 @@ run mesk storage list
 expect_eq "$RC $(grep -c '^   Device: ' <<<"$OUT")" "0 4096" "status and disks listed"
 expect_out_has "mpx.pthba2:C15:T255:L0"
 
+case_ "a change that meets a file it cannot write, a symlink or another user's directory changes nothing"
+# Each row plants an obstacle below the root of a host that differs from the one the command
+# makes; the command fails and leaves `show` and every file as they were, or (status 0) gets
+# round a planted symlink without writing through it.
+elsewhere="$E2E_DIR/elsewhere"
+snapshot() {
+    "$HOSTSIM" show
+    find "$MESK_HOST_ROOT" "$elsewhere" -printf '%P %y %m %u %l\n' | sort
+    find "$MESK_HOST_ROOT" "$elsewhere" -type f -exec sha256sum {} + | sort
+}
+echo '{"settings": {"datastoreName": "merged"}, "services": {"mesktraced": {"state": "stopped"}}}' >"$E2E_DIR/patch.json"
+nobody_row=""
+if [ "$(id -u)" = 0 ]; then nobody_row="chown nobody etc/init.d|reset|etc/init.d: belongs to another user"; fi
+while IFS='|' read -r plant command message; do
+    [ -n "$plant" ] || continue
+    "$HOSTSIM" populate --luns 4
+    "$HOSTSIM" show | jq '.settings.datastoreName = "loaded" | .services.mesktraced.state = "stopped"' >"$E2E_DIR/doc.json"
+    rm -rf "$elsewhere" && mkdir "$elsewhere" && printf 'secret\n' >"$elsewhere/secret" && chmod 600 "$elsewhere/secret"
+    (cd "$MESK_HOST_ROOT" && set -- $plant && case $1 in
+        dir) rm -f "$2" && mkdir "$2" ;;
+        link) mv "$2" "$elsewhere/" && ln -s "$elsewhere/${2##*/}" "$2" ;;
+        *) "$@" ;;
+    esac)
+    before=$(snapshot)
+    case_ "$command after $plant"
+    _capture "$HOSTSIM" $command
+    expect_rc $([ -n "$message" ] && echo 1 || echo 0)
+    expect_err_has "$message"
+    if [ -n "$message" ]; then expect_eq "$(snapshot)" "$before" "host and files"; fi
+    expect_eq "$(cat "$elsewhere/secret"; stat -c %a "$elsewhere/secret")" "secret
+600" "file behind a symlink"
+    chmod -R go-w "$MESK_HOST_ROOT" && chown -R "$(id -u)" "$MESK_HOST_ROOT" && rm -rf "$MESK_HOST_ROOT"/*
+done <<TABLE
+dir var/lib/hostsim/mesktraced.state|reset|cannot write $MESK_HOST_ROOT/var/lib/hostsim/mesktraced.state: Is a directory
+dir var/lib/hostsim/mesktraced.state|populate --luns 8|: Is a directory
+dir var/lib/hostsim/mesktraced.state|load $E2E_DIR/doc.json|: Is a directory
+dir var/lib/hostsim/mesktraced.state|load --merge $E2E_DIR/patch.json|: Is a directory
+dir var/lib/hostsim/mesktraced.state|service mesktraced running|: Is a directory
+dir etc/init.d/mesktraced|reset|: Is a directory
+link etc|reset|$MESK_HOST_ROOT/etc: is a symlink
+chmod o+w var/lib/hostsim|service mesktraced running|var/lib/hostsim: is writable by every user
+ln -s $elsewhere/secret etc/init.d/mesktraced.new|reset|
+$nobody_row
+TABLE
+
+case_ "every file has its mode whatever the umask; the service state is data, not shell code"
+(umask 000 && "$HOSTSIM" reset)
+expect_eq "$(cd "$MESK_HOST_ROOT" && find . -printf '%m %p\n' | sort -k2 | tr '\n' ' ')" \
+    "755 . 755 ./etc 755 ./etc/init.d 755 ./etc/init.d/mesktraced 755 ./etc/orvane 755 ./etc/orvane/mesk 644 ./etc/orvane/mesk/mesktraced.conf 755 ./usr 755 ./usr/lib 755 ./usr/lib/orvane 755 ./usr/lib/orvane/tavord 755 ./usr/lib/orvane/tavord/bin 755 ./usr/lib/orvane/tavord/bin/notifyDatastore.py 755 ./var 755 ./var/lib 755 ./var/lib/hostsim 644 ./var/lib/hostsim/mesktraced.state 755 ./var/log 755 ./var/log/hostsim 644 ./var/log/hostsim/calls.jsonl 644 ./var/log/hostsim/scripts.jsonl " "modes"
+echo "id >$E2E_DIR/ran" >>"$MESK_HOST_ROOT/var/lib/hostsim/mesktraced.state"
+run mesk trace get
+expect_eq "$RC $(cat "$E2E_DIR/ran" 2>/dev/null)" "0 " "trace get, and what the state file ran"
+chmod o+w "$MESK_HOST_ROOT/etc/init.d"
+printf '#!/bin/sh\nid >%s\n' "$E2E_DIR/ran" >"$MESK_HOST_ROOT/etc/init.d/mesktraced"
+run mesk trace get
+expect_eq "$RC $(cat "$E2E_DIR/ran" 2>/dev/null)" "1 " "trace get of a script every user may replace"
+chmod o-w "$MESK_HOST_ROOT/etc/init.d"
+
 finish
