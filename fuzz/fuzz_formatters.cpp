@@ -2,9 +2,9 @@
 //
 // The input describes a result (structures, lists and scalars with any names and texts, also
 // list elements that do not match their template) and the output parameters a command could
-// give. Every formatter must handle it; the machine-readable ones must stay readable: json
-// and json-pretty parse as JSON, xml is well-formed, and csv reads back, by RFC 4180, as the
-// very cells of the result's grid (as UTF-8 text).
+// give. Every formatter must handle it; each one is read back as its row says: JSON parses,
+// XML is well-formed, CSV reads back, by RFC 4180, as the very cells of the result's grid (as
+// UTF-8 text); what is for the terminal holds no control character.
 #include <fuzzer/FuzzedDataProvider.h>
 
 #include <nlohmann/json.hpp>
@@ -22,9 +22,11 @@
 #include "autocli/MetaObj.h"
 
 using Kalmor::AutoCli::App::BuildGrid;
+using Kalmor::AutoCli::App::CellStyle;
 using Kalmor::AutoCli::App::FormatOptions;
 using Kalmor::AutoCli::App::Grid;
 using Kalmor::AutoCli::App::OutputLayout;
+using Kalmor::AutoCli::App::ReadBack;
 using Kalmor::MetaObj::MetaBool;
 using Kalmor::MetaObj::MetaInt;
 using Kalmor::MetaObj::MetaList;
@@ -257,9 +259,8 @@ bool WellFormedXml(const std::string& xml) {
 
 // ---- CSV: an RFC 4180 reader -----------------------------------------------------------
 
-// Reads records of fields separated by commas and ended by a line feed (a carriage return
-// before it is taken as part of the line end); a quoted field may hold commas, quotation
-// marks (doubled) and line breaks. Returns false on a malformed text.
+// Reads records of fields separated by commas and ended by CR LF; a quoted field may hold
+// commas, quotation marks (doubled) and line breaks. Returns false on a malformed text.
 bool ReadCsv(const std::string& text, std::vector<std::vector<std::string>>& records) {
     size_t i = 0;
     while (i < text.size()) {
@@ -282,8 +283,8 @@ bool ReadCsv(const std::string& text, std::vector<std::vector<std::string>>& rec
                     field += text[i++];
                 }
             } else {
-                while (i < text.size() && text[i] != ',' && text[i] != '\n') {
-                    if (text[i] == '"' || text[i] == '\r') return false;
+                while (i < text.size() && text[i] != ',' && text[i] != '\r') {
+                    if (text[i] == '"' || text[i] == '\n') return false;
                     field += text[i++];
                 }
             }
@@ -293,8 +294,8 @@ bool ReadCsv(const std::string& text, std::vector<std::vector<std::string>>& rec
                 ++i;
                 continue;
             }
-            if (text[i] != '\n') return false;
-            ++i;
+            if (text.compare(i, 2, "\r\n") != 0) return false;
+            i += 2;
             break;
         }
         records.push_back(std::move(record));
@@ -302,31 +303,13 @@ bool ReadCsv(const std::string& text, std::vector<std::vector<std::string>>& rec
     return true;
 }
 
-}  // namespace
-
-extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
-    FuzzedDataProvider in(data, size);
-    const FormatOptions options = MakeOptions(in);
-    const std::shared_ptr<MetaObject> root = MakeRoot(in);
-
-    for (const auto& name : App::FormatterNames()) {
-        App::FindFormatter(name)(*root, options);
-    }
-
-    for (const auto formatter : {App::FormatJson, App::FormatJsonPretty}) {
-        const nlohmann::json parsed =
-            nlohmann::json::parse(formatter(*root, options), nullptr, false);
-        FUZZ_CHECK(!parsed.is_discarded());
-    }
-
-    FUZZ_CHECK(WellFormedXml(App::FormatXml(*root, options)));
-
-    const std::string csv = App::FormatCsv(*root, options);
+// The csv output reads back as the cells of the result's grid, or one value per record.
+void CheckCsv(const std::string& csv, const MetaObject& root, const FormatOptions& options) {
     std::vector<std::vector<std::string>> records;
     FUZZ_CHECK(ReadCsv(csv, records));
     OutputLayout layout(options);
     Grid grid;
-    if (BuildGrid(*root, layout, false, grid)) {
+    if (BuildGrid(root, layout, CellStyle::kMachine, grid)) {
         // Cells as text: bytes that are not UTF-8 come out as U+FFFD.
         std::vector<std::vector<std::string>> expected;
         if (!grid.columns.empty()) {
@@ -339,6 +322,39 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
         FUZZ_CHECK(records == expected);
     } else {
         for (const auto& record : records) FUZZ_CHECK(record.size() == 1);
+    }
+}
+
+}  // namespace
+
+extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
+    FuzzedDataProvider in(data, size);
+    const FormatOptions options = MakeOptions(in);
+    const std::shared_ptr<MetaObject> root = MakeRoot(in);
+
+    for (const auto& formatter : App::Formatters()) {
+        const std::string text = formatter.function(*root, options);
+        switch (formatter.readBack) {
+            case ReadBack::kNone:
+                // For the terminal: no control character but its own line breaks (C1 is
+                // 0xC2 0x80 to 0xC2 0x9F in UTF-8), whatever the host reported.
+                for (size_t i = 0; i < text.size(); ++i) {
+                    const auto byte = static_cast<unsigned char>(text[i]);
+                    FUZZ_CHECK(byte == '\n' || (byte >= 0x20 && byte != 0x7F));
+                    FUZZ_CHECK(byte != 0xC2 || i + 1 == text.size() ||
+                               (static_cast<unsigned char>(text[i + 1]) & 0xE0) != 0x80);
+                }
+                break;
+            case ReadBack::kJson:
+                FUZZ_CHECK(!nlohmann::json::parse(text, nullptr, false).is_discarded());
+                break;
+            case ReadBack::kXml:
+                FUZZ_CHECK(WellFormedXml(text));
+                break;
+            case ReadBack::kCsv:
+                CheckCsv(text, *root, options);
+                break;
+        }
     }
     return 0;
 }

@@ -1,7 +1,9 @@
 #!/bin/bash
-# Every fetcher's result on a populated host: json-pretty has the same fields as json, and csv
-# a header row of the json field names (that each format parses, test_bad_input.sh checks).
-# Their json, and that of a few changes, matches the schema that the JSON reference gives.
+# Every fetcher's result on a populated host whose every text ends in control characters:
+# json-pretty has the same fields as json, csv a header row of the json field names (that
+# each format parses, test_bad_input.sh checks), and simple and table show no control
+# character raw (C0 but their own line feeds, DEL, C1). Their json, and that of a few
+# changes, matches the schema that the JSON reference gives.
 . "$(dirname "$0")/lib.sh"
 
 # A stretched cluster, so that the preferred fault domain can be read too.
@@ -9,6 +11,15 @@ sim populate --luns 3 --agents 2 --nics 2
 expect_rc 0
 sim load --merge - <<<'{"cluster":{"stretched":true}}'
 expect_rc 0
+# Every text but UUIDs, addresses and the service state: a window title, a screen clear, a C1
+# control sequence introducer and a tab.
+EVIL=$'\e]0;owned\a\e[2J\xc2\x9b1m\t'
+sim show
+sim load - <<<"$(jq --arg evil "$EVIL" 'walk(if type == "string" and
+    (test("^([0-9a-fA-F.:-]*|running|stopped)$") | not) then . + $evil else . end)' <<<"$OUT")"
+expect_rc 0
+ok mesk storage list --formatter table
+expect_out_has '\x1b]0;owned\x07\x1b[2J\u009b1m\t'
 
 # The fetchers, as the reference lists them: new ones are covered without editing this file.
 mapfile -t FETCHERS < <("$AUTOCLI" --reference |
@@ -33,8 +44,14 @@ for command in "${FETCHERS[@]}"; do
     header=$(jq -r 'if type == "array" then .[0] else . end
                     | if type == "object" then keys_unsorted | join(",") else "value" end' <<<"$json")
     if [ "$json" != "[]" ]; then
-        expect_eq "${OUT%%$'\n'*}" "$header" "csv header"
+        expect_eq "${OUT%%$'\r\n'*}" "$header" "csv header"
     fi
+    for format in simple table; do
+        # shellcheck disable=SC2086
+        raw=$("$AUTOCLI" $command --formatter $format |
+            LC_ALL=C grep -caP '[\x00-\x09\x0b-\x1f\x7f]|\xc2[\x80-\x9f]')
+        expect_eq "$raw" 0 "lines with a raw control character in $format"
+    done
 done
 
 case_ "changes, and a read not marked fetcher, in json"

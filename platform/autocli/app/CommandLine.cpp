@@ -32,24 +32,6 @@ RunResult UsageError(RunResult result, const NamespaceNode* node, const std::str
     return result;
 }
 
-// The fields that the command's result can have, from its output description: those of the
-// top-level structure, or of the element template of a list of structures.
-const MetaObj::MetaStruct* ResultStructure(const MetaObj::MetaObject* root) {
-    if (root == nullptr) {
-        return nullptr;
-    }
-    if (root->GetType() == MetaObj::META_STRUCT) {
-        return static_cast<const MetaObj::MetaStruct*>(root);
-    }
-    if (root->GetType() == MetaObj::META_LIST) {
-        const auto& element = static_cast<const MetaObj::MetaList*>(root)->GetTemplate();
-        if (element && element->GetType() == MetaObj::META_STRUCT) {
-            return static_cast<const MetaObj::MetaStruct*>(element.get());
-        }
-    }
-    return nullptr;
-}
-
 // Refuses --fields names that the command's result does not have, before the command runs.
 std::string CheckFields(CommandSpec& command, const std::vector<std::string>& fields) {
     auto outputSpec = command.GetOutputSpec();

@@ -1,4 +1,5 @@
-// The "csv" formatter: a header row of field names and one row per structure.
+// The "csv" formatter: a header row of field names and one row per structure, each record
+// ended by CR LF as RFC 4180 has it. A cell holding a list is a JSON array.
 #include "Formatter.h"
 #include "Text.h"
 
@@ -33,7 +34,7 @@ void AppendRow(std::string& text, const std::vector<std::string>& cells) {
         }
         text += Cell(cells[i]);
     }
-    text += '\n';
+    text += "\r\n";
 }
 
 }  // namespace
@@ -41,7 +42,7 @@ void AppendRow(std::string& text, const std::vector<std::string>& cells) {
 std::string FormatCsv(const MetaObj::MetaObject& root, const FormatOptions& options) {
     OutputLayout layout(options);
     Grid grid;
-    if (!BuildGrid(root, layout, false, grid)) {
+    if (!BuildGrid(root, layout, CellStyle::kMachine, grid)) {
         // Texts, integers and booleans: one column named "value".
         grid.columns = {"value"};
         if (root.GetType() == MetaObj::META_LIST) {

@@ -37,15 +37,13 @@ bool HasField(const MetaStruct& structure, const std::string& name) {
     return false;
 }
 
-struct NamedFormatter {
-    const char* name;
-    FormatterFunction function;
-};
-
-const NamedFormatter kFormatters[] = {
-    {"simple", FormatSimple},          {"table", FormatTable}, {"json", FormatJson},
-    {"json-pretty", FormatJsonPretty}, {"xml", FormatXml},     {"csv", FormatCsv},
-};
+// A list of texts in a CSV cell: a JSON array, which any JSON parser splits back.
+std::string MachineCell(const MetaObject* value) {
+    if (value != nullptr && value->GetType() == MetaObj::META_LIST) {
+        return ToJson(value).dump(-1, ' ', false, nlohmann::json::error_handler_t::replace);
+    }
+    return ValueText(value);
+}
 
 }  // namespace
 
@@ -187,7 +185,23 @@ std::string ValueText(const MetaObject* value, const std::string& unit) {
     return text;
 }
 
-bool BuildGrid(const MetaObject& root, const OutputLayout& layout, bool withUnits, Grid& grid) {
+const MetaStruct* ResultStructure(const MetaObject* root) {
+    if (root == nullptr) {
+        return nullptr;
+    }
+    if (root->GetType() == MetaObj::META_STRUCT) {
+        return static_cast<const MetaStruct*>(root);
+    }
+    if (root->GetType() == MetaObj::META_LIST) {
+        const auto& element = static_cast<const MetaObj::MetaList*>(root)->GetTemplate();
+        if (element && element->GetType() == MetaObj::META_STRUCT) {
+            return static_cast<const MetaStruct*>(element.get());
+        }
+    }
+    return nullptr;
+}
+
+bool BuildGrid(const MetaObject& root, const OutputLayout& layout, CellStyle style, Grid& grid) {
     std::vector<const MetaStruct*> elements;
     const MetaStruct* model = nullptr;
     if (root.GetType() == MetaObj::META_STRUCT) {
@@ -222,16 +236,39 @@ bool BuildGrid(const MetaObject& root, const OutputLayout& layout, bool withUnit
     for (const auto* element : elements) {
         std::vector<std::string> row;
         for (const auto& column : grid.columns) {
-            std::string unit = withUnits ? layout.Unit(element->GetName(), column) : "";
-            row.push_back(ValueText(element->GetField(column).get(), unit));
+            const MetaObject* value = element->GetField(column).get();
+            row.push_back(
+                style == CellStyle::kScreen
+                    ? ScreenText(ValueText(value, layout.Unit(element->GetName(), column)))
+                    : MachineCell(value));
         }
         grid.rows.push_back(std::move(row));
+    }
+    if (style == CellStyle::kScreen) {
+        for (auto& column : grid.columns) {
+            column = ScreenText(column);
+        }
     }
     return true;
 }
 
+const std::vector<FormatterRow>& Formatters() {
+    // clang-format off
+    static const std::vector<FormatterRow> kFormatters = {
+        // name         function          --fields  --no-header  read back
+        {"simple",      FormatSimple,     true,     false,       ReadBack::kNone},
+        {"table",       FormatTable,      true,     true,        ReadBack::kNone},
+        {"json",        FormatJson,       true,     false,       ReadBack::kJson},
+        {"json-pretty", FormatJsonPretty, true,     false,       ReadBack::kJson},
+        {"xml",         FormatXml,        true,     false,       ReadBack::kXml},
+        {"csv",         FormatCsv,        true,     true,        ReadBack::kCsv},
+    };
+    // clang-format on
+    return kFormatters;
+}
+
 FormatterFunction FindFormatter(const std::string& name) {
-    for (const auto& formatter : kFormatters) {
+    for (const auto& formatter : Formatters()) {
         if (name == formatter.name) {
             return formatter.function;
         }
@@ -242,7 +279,7 @@ FormatterFunction FindFormatter(const std::string& name) {
 const std::vector<std::string>& FormatterNames() {
     static const std::vector<std::string> names = [] {
         std::vector<std::string> list;
-        for (const auto& formatter : kFormatters) {
+        for (const auto& formatter : Formatters()) {
             list.push_back(formatter.name);
         }
         return list;

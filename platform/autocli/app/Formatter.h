@@ -21,7 +21,7 @@ struct FormatOptions {
     // --fields: the fields to show of each top-level structure, in this order.
     bool fieldsGiven = false;
     std::vector<std::string> fields;
-    // --no-header: no header row in table and csv output.
+    // --no-header: no header row in the formatters whose row says they have one.
     bool noHeader = false;
 };
 
@@ -67,10 +67,23 @@ struct Grid {
     std::vector<std::vector<std::string>> rows;
 };
 
+// How a grid's cells are written.
+enum class CellStyle {
+    // For a person at a terminal: with unit labels, control characters escaped (ScreenText).
+    kScreen,
+    // For a program: no units, and a list as a JSON array so that it splits back whatever
+    // its items hold.
+    kMachine,
+};
+
 // Fills `grid` from a structure or a list of structures and returns true; returns false for
-// any other result. Cells carry unit labels when `withUnits` is set.
-bool BuildGrid(const MetaObj::MetaObject& root, const OutputLayout& layout, bool withUnits,
+// any other result.
+bool BuildGrid(const MetaObj::MetaObject& root, const OutputLayout& layout, CellStyle style,
                Grid& grid);
+
+// The structure that a command's result holds, from its output description or a result: a
+// top-level structure, or the element template of a list of structures; nullptr otherwise.
+const MetaObj::MetaStruct* ResultStructure(const MetaObj::MetaObject* root);
 
 // A result that is not a structure or a list of structures, as "simple" and "table" print
 // it: a text or integer on one line, a list of texts one per line, and a boolean as nothing
@@ -79,8 +92,10 @@ bool BuildGrid(const MetaObj::MetaObject& root, const OutputLayout& layout, bool
 std::string PlainText(const MetaObj::MetaObject& root);
 
 // The result as JSON: structures as objects with fields in declared order, lists as arrays,
-// empty scalars as null.
-nlohmann::ordered_json ToJson(const MetaObj::MetaObject* value);
+// empty scalars as null. With `fields`, a top-level structure (the result, or an element of
+// a result that is a list) has only those fields, in that order.
+nlohmann::ordered_json ToJson(const MetaObj::MetaObject* value,
+                              const std::vector<std::string>* fields = nullptr);
 
 using FormatterFunction = std::string (*)(const MetaObj::MetaObject& root,
                                           const FormatOptions& options);
@@ -92,6 +107,26 @@ std::string FormatJsonPretty(const MetaObj::MetaObject& root, const FormatOption
 std::string FormatXml(const MetaObj::MetaObject& root, const FormatOptions& options);
 std::string FormatCsv(const MetaObj::MetaObject& root, const FormatOptions& options);
 
+// How a test or fuzz target reads a formatter's output back to check it.
+enum class ReadBack {
+    kNone,  // for a person: not read back
+    kJson,  // one JSON document
+    kXml,   // one well-formed XML document
+    kCsv,   // RFC 4180 records, the very cells of the result's grid (CellStyle::kMachine)
+};
+
+// One formatter and what it honours. Help, the fuzz target and the tests read these rows, so
+// that a new formatter is one row here and its own source file.
+struct FormatterRow {
+    const char* name;
+    FormatterFunction function;
+    bool honoursFields;    // --fields narrows and orders the top-level fields
+    bool honoursNoHeader;  // --no-header drops its header row
+    ReadBack readBack;
+};
+
+// Every formatter, in the order help lists them.
+const std::vector<FormatterRow>& Formatters();
 // The formatter of that name, or nullptr.
 FormatterFunction FindFormatter(const std::string& name);
 // The formatter names, in the order help lists them.

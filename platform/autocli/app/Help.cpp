@@ -112,6 +112,25 @@ std::string RangeText(int64_t minimum, int64_t maximum) {
     return std::to_string(minimum) + separator + std::to_string(maximum);
 }
 
+// The names of the formatters whose row has `property` set: "table and csv"; empty when every
+// formatter has it.
+std::string FormattersWith(bool FormatterRow::*property) {
+    std::vector<std::string> names;
+    for (const auto& formatter : Formatters()) {
+        if (formatter.*property) {
+            names.push_back(formatter.name);
+        }
+    }
+    if (names.size() == Formatters().size()) {
+        return std::string();
+    }
+    const std::string last = names.empty() ? std::string() : names.back();
+    if (!names.empty()) {
+        names.pop_back();
+    }
+    return names.empty() ? last : Join(names, ", ") + " and " + last;
+}
+
 void AppendParagraph(std::string& text, const std::string& paragraph) {
     if (!paragraph.empty()) {
         const size_t wrapWidth = WrapWidth();
@@ -170,11 +189,15 @@ std::string RenderNamespaceHelp(const NamespaceNode& node) {
     }
 
     if (isRoot) {
+        const std::string fieldsIn = FormattersWith(&FormatterRow::honoursFields);
+        const std::string headerIn = FormattersWith(&FormatterRow::honoursNoHeader);
         text += "\nOptions:\n" +
                 RenderRows({
                     {"--formatter NAME", "Output format: " + Join(FormatterNames(), ", ")},
-                    {"--fields A,B", "Show only these fields (simple, table and csv)"},
-                    {"--no-header", "Leave out the header row of table and csv output"},
+                    {"--fields A,B", "Show only these fields, in this order" +
+                                         (fieldsIn.empty() ? "" : " (" + fieldsIn + ")")},
+                    {"--no-header", "Leave out the header row" +
+                                        (headerIn.empty() ? "" : " of " + headerIn + " output")},
                     {"--list-commands", "Print every command path, one per line"},
                     {"--reference", "Print the command reference as Markdown"},
                     {"--version", "Print the versions of autocli and of each plug-in"},
@@ -191,7 +214,7 @@ std::string RenderNamespaceHelp(const NamespaceNode& node) {
     return text;
 }
 
-std::string RenderCommandHelp(const CommandSpec& command, const CallSpec::InputSpec& spec) {
+std::string RenderCommandHelp(CommandSpec& command, const CallSpec::InputSpec& spec) {
     std::vector<Row> rows;
     for (const auto& parameter : spec.GetParameters()) {
         if (!parameter) {
@@ -212,6 +235,18 @@ std::string RenderCommandHelp(const CommandSpec& command, const CallSpec::InputS
     AppendParagraph(text, command.GetDescription());
     if (!rows.empty()) {
         text += "\nCommand options:\n" + RenderRows(rows);
+    }
+    // What --fields may name: the fields of the structure the command returns.
+    auto outputSpec = command.GetOutputSpec();
+    if (const MetaObj::MetaStruct* structure =
+            ResultStructure(outputSpec ? outputSpec->GetRootObject().get() : nullptr)) {
+        std::vector<std::string> names;
+        for (const auto& field : structure->GetFields()) {
+            names.push_back(field.name);
+        }
+        if (!names.empty()) {
+            text += "\nOutput fields: " + Join(names, ", ") + "\n";
+        }
     }
     return text;
 }

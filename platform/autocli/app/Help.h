@@ -18,8 +18,9 @@ std::string ExpandEnum(const CallSpec::ParameterSpec& parameter);
 std::string RenderNamespaceHelp(const NamespaceNode& node);
 
 // A command's help: usage, description and every parameter with its short and long name,
-// kind, whether it is required and its description.
-std::string RenderCommandHelp(const CommandSpec& command, const CallSpec::InputSpec& spec);
+// kind, whether it is required and its description; then the fields of its result, which
+// --fields may name.
+std::string RenderCommandHelp(CommandSpec& command, const CallSpec::InputSpec& spec);
 
 }  // namespace App
 }  // namespace AutoCli

@@ -1,5 +1,7 @@
-// The "simple" formatter: titled blocks of "Field: value" lines.
+// The "simple" formatter: titled blocks of "Field: value" lines. Every text is shown through
+// ScreenText: host data never reaches the terminal raw.
 #include "Formatter.h"
+#include "Text.h"
 
 namespace Kalmor {
 namespace AutoCli {
@@ -52,20 +54,21 @@ void AppendStruct(std::string& text, const MetaStruct& structure, size_t indent,
                   const OutputLayout& layout, bool topLevel) {
     size_t fieldIndent = indent;
     if (layout.HasTitle(structure.GetName())) {
-        AppendLine(text, indent, layout.Title(structure));
+        AppendLine(text, indent, ScreenText(layout.Title(structure)));
         fieldIndent += kIndentStep;
     }
     for (const auto* field : layout.Fields(structure, topLevel)) {
         const MetaObject* value = field->value.get();
         if (IsStructured(value)) {
-            AppendLine(text, fieldIndent, field->name + ":");
+            AppendLine(text, fieldIndent, ScreenText(field->name) + ":");
             AppendNested(text, *value, fieldIndent + kIndentStep, layout);
             continue;
         }
         // Appended piece by piece: a long listing has tens of thousands of these lines.
-        const std::string shown = ValueText(value, layout.Unit(structure.GetName(), field->name));
+        const std::string shown =
+            ScreenText(ValueText(value, layout.Unit(structure.GetName(), field->name)));
         text.append(fieldIndent, ' ');
-        text += field->name;
+        text += ScreenText(field->name);
         text += shown.empty() ? ":" : ": ";
         text += shown;
         text += '\n';
@@ -86,17 +89,17 @@ std::string PlainText(const MetaObject& root) {
         }
         case MetaObj::META_STRING:
             if (static_cast<const MetaObj::MetaString&>(root).HasValue()) {
-                text = ValueText(&root) + "\n";
+                text = ScreenText(ValueText(&root)) + "\n";
             }
             break;
         case MetaObj::META_INT:
             if (static_cast<const MetaObj::MetaInt&>(root).HasValue()) {
-                text = ValueText(&root) + "\n";
+                text = ScreenText(ValueText(&root)) + "\n";
             }
             break;
         case MetaObj::META_LIST:
             for (const auto& element : static_cast<const MetaObj::MetaList&>(root).GetElements()) {
-                text += ValueText(element.get()) + "\n";
+                text += ScreenText(ValueText(element.get())) + "\n";
             }
             break;
         case MetaObj::META_STRUCT:

@@ -1,4 +1,5 @@
-// The "table" formatter: aligned columns under a header row and a rule.
+// The "table" formatter: aligned columns under a header row and a rule, padded by the
+// columns a terminal gives each text; cells are shown through ScreenText.
 #include <algorithm>
 
 #include "Formatter.h"
@@ -30,7 +31,7 @@ void AppendRow(std::string& text, const std::vector<std::string>& cells,
 std::string FormatTable(const MetaObj::MetaObject& root, const FormatOptions& options) {
     OutputLayout layout(options);
     Grid grid;
-    if (!BuildGrid(root, layout, true, grid)) {
+    if (!BuildGrid(root, layout, CellStyle::kScreen, grid)) {
         return PlainText(root);
     }
     if (grid.columns.empty()) {
@@ -51,7 +52,7 @@ std::string FormatTable(const MetaObj::MetaObject& root, const FormatOptions& op
     if (!options.noHeader) {
         // A title that names a field differs per row: the column says it already.
         if (layout.HasTitle(grid.structName) && !layout.TitleNamesFields(grid.structName)) {
-            text += layout.RawTitle(grid.structName) + "\n";
+            text += ScreenText(layout.RawTitle(grid.structName)) + "\n";
         }
         AppendRow(text, grid.columns, widths);
         std::vector<std::string> rule;

@@ -1,6 +1,9 @@
 // Small text helpers shared by the parser, the help and the formatters.
 #include "Text.h"
 
+#include <locale.h>
+#include <wchar.h>
+
 #include <algorithm>
 
 namespace Kalmor {
@@ -48,6 +51,25 @@ size_t DecodeOne(const std::string& text, size_t pos, char32_t& codePoint) {
         return 0;
     }
     return length;
+}
+
+// The locale under which wcwidth measures characters: the built-in UTF-8 locale, whatever the
+// user's own (the process's locale, and with it number formatting, stays "C").
+locale_t WidthLocale() {
+    static const locale_t locale = [] {
+        locale_t found = newlocale(LC_CTYPE_MASK, "C.UTF-8", static_cast<locale_t>(nullptr));
+        return found != static_cast<locale_t>(nullptr)
+                   ? found
+                   : newlocale(LC_CTYPE_MASK, "", static_cast<locale_t>(nullptr));
+    }();
+    return locale;
+}
+
+// Columns of one character: what wcwidth says, and one for what it cannot tell (unassigned
+// characters, or no UTF-8 locale at all).
+size_t CharWidth(char32_t codePoint) {
+    const int width = wcwidth(static_cast<wchar_t>(codePoint));
+    return width < 0 ? 1 : static_cast<size_t>(width);
 }
 
 bool AllowedInXml(char32_t c) {
@@ -147,11 +169,25 @@ std::string DidYouMean(const std::string& word, const std::vector<std::string>& 
 size_t DisplayWidth(const std::string& text) {
     size_t width = 0;
     size_t pos = 0;
+    // Printable ASCII, by far the most common, is one column per byte without asking wcwidth.
+    while (pos < text.size() && text[pos] >= 0x20 && text[pos] < 0x7F) {
+        ++pos;
+        ++width;
+    }
+    if (pos == text.size()) {
+        return width;
+    }
+    const locale_t locale = WidthLocale();
+    const locale_t previous =
+        locale != static_cast<locale_t>(nullptr) ? uselocale(locale) : static_cast<locale_t>(0);
     while (pos < text.size()) {
         char32_t codePoint;
         size_t length = DecodeOne(text, pos, codePoint);
         pos += length == 0 ? 1 : length;
-        ++width;
+        width += length == 0 ? 1 : CharWidth(codePoint);
+    }
+    if (previous != static_cast<locale_t>(0)) {
+        uselocale(previous);
     }
     return width;
 }
@@ -193,6 +229,54 @@ std::string MessageText(const std::string& text) {
         }
     }
     return line;
+}
+
+std::string ScreenText(const std::string& text) {
+    static const char kHex[] = "0123456789abcdef";
+    // Most texts hold nothing to escape: plain ASCII comes back as it is.
+    bool plain = true;
+    for (char c : text) {
+        const auto byte = static_cast<unsigned char>(c);
+        plain = plain && byte >= 0x20 && byte < 0x7F;
+    }
+    if (plain) {
+        return text;
+    }
+    const auto hex = [](const char* prefix, char32_t value, int digits) {
+        std::string escaped = prefix;
+        for (int shift = 4 * (digits - 1); shift >= 0; shift -= 4) {
+            escaped += kHex[(value >> shift) & 0xF];
+        }
+        return escaped;
+    };
+    std::string shown;
+    size_t pos = 0;
+    while (pos < text.size()) {
+        char32_t codePoint;
+        const size_t length = DecodeOne(text, pos, codePoint);
+        const auto byte = static_cast<unsigned char>(text[pos]);
+        if (length == 0) {
+            // A stray byte: a terminal reading 8-bit controls would obey 0x80 to 0x9F.
+            shown += byte < 0xA0 ? hex("\\x", byte, 2) : std::string(1, text[pos]);
+            ++pos;
+            continue;
+        }
+        if (codePoint == '\n') {
+            shown += "\\n";
+        } else if (codePoint == '\r') {
+            shown += "\\r";
+        } else if (codePoint == '\t') {
+            shown += "\\t";
+        } else if (codePoint < 0x20 || codePoint == 0x7F) {
+            shown += hex("\\x", codePoint, 2);
+        } else if (codePoint >= 0x80 && codePoint < 0xA0) {
+            shown += hex("\\u", codePoint, 4);
+        } else {
+            shown.append(text, pos, length);
+        }
+        pos += length;
+    }
+    return shown;
 }
 
 std::string PadRight(const std::string& text, size_t width) {

@@ -22,8 +22,9 @@ std::string Join(const std::vector<std::string>& items, const std::string& separ
 // deletes, replaces or swaps neighbouring letters); "" when no choice is that close.
 std::string DidYouMean(const std::string& word, const std::vector<std::string>& choices);
 
-// The number of characters of a UTF-8 text as a terminal shows them (one per code point;
-// bytes that are not valid UTF-8 count one each).
+// The number of columns a UTF-8 text takes on a terminal: wcwidth of each character under a
+// UTF-8 locale (two for wide East Asian characters and most emoji, none for combining
+// marks), one per byte that is not valid UTF-8.
 size_t DisplayWidth(const std::string& text);
 
 // The text with every invalid UTF-8 sequence replaced by U+FFFD. When `forXml` is set, also
@@ -35,6 +36,12 @@ std::string ValidUtf8(const std::string& text, bool forXml = false);
 // control character but tab written as an escape ("\n", "\r", "\x1b"), so that a value
 // echoed in an error can neither break the message into lines nor drive the terminal.
 std::string MessageText(const std::string& text);
+
+// Host data made safe to show on a terminal: every control character (C0 including tab, DEL,
+// C1) and every stray byte that a terminal could take for C1 is written as an escape ("\n",
+// "\t", "\x1b", "\u009b", "\x9b"), so that no value can move the cursor, retitle the
+// window or clear the screen. Other text, invalid UTF-8 included, is kept as it is.
+std::string ScreenText(const std::string& text);
 
 // The text padded with blanks to `width` display characters.
 std::string PadRight(const std::string& text, size_t width);

@@ -13,7 +13,8 @@
 //   </output>
 //
 // Scalars without a value are empty elements (<string/>). Every field is shown, in declared
-// order, as in the JSON output.
+// order, as in the JSON output; --fields keeps those named of a top-level structure (the
+// result, or an element of a result that is a list), in the order given.
 #include "Formatter.h"
 #include "Text.h"
 
@@ -107,15 +108,15 @@ std::string Scalar(const MetaObject* value) {
     return std::string("<") + name + ">" + Escape(text) + "</" + name + ">";
 }
 
-void AppendValue(std::string& text, const MetaObject* value, size_t indent);
-
 void AppendLine(std::string& text, size_t indent, const std::string& line) {
     text.append(indent, ' ');
     text += line;
     text += '\n';
 }
 
-void AppendValue(std::string& text, const MetaObject* value, size_t indent) {
+// `fields`, when given, are the fields to show of a top-level structure.
+void AppendValue(std::string& text, const MetaObject* value, size_t indent,
+                 const std::vector<std::string>* fields = nullptr) {
     if (IsScalar(value)) {
         AppendLine(text, indent, Scalar(value));
         return;
@@ -124,7 +125,23 @@ void AppendValue(std::string& text, const MetaObject* value, size_t indent) {
         const auto& structure = static_cast<const MetaObj::MetaStruct&>(*value);
         AppendLine(text, indent,
                    "<structure name=\"" + EscapeAttribute(structure.GetName()) + "\">");
+        std::vector<const MetaObj::MetaStruct::Field*> shown;
         for (const auto& field : structure.GetFields()) {
+            shown.push_back(&field);
+        }
+        if (fields != nullptr) {
+            shown.clear();
+            for (const auto& name : *fields) {
+                for (const auto& field : structure.GetFields()) {
+                    if (field.name == name) {
+                        shown.push_back(&field);
+                        break;
+                    }
+                }
+            }
+        }
+        for (const auto* fieldPointer : shown) {
+            const auto& field = *fieldPointer;
             std::string open = "<field name=\"" + EscapeAttribute(field.name) + "\">";
             if (IsScalar(field.value.get())) {
                 AppendLine(text, indent + kIndentStep,
@@ -146,16 +163,16 @@ void AppendValue(std::string& text, const MetaObject* value, size_t indent) {
     }
     AppendLine(text, indent, open + ">");
     for (const auto& element : list.GetElements()) {
-        AppendValue(text, element.get(), indent + kIndentStep);
+        AppendValue(text, element.get(), indent + kIndentStep, fields);
     }
     AppendLine(text, indent, "</list>");
 }
 
 }  // namespace
 
-std::string FormatXml(const MetaObject& root, const FormatOptions& /*options*/) {
+std::string FormatXml(const MetaObject& root, const FormatOptions& options) {
     std::string text = "<?xml version=\"1.0\" encoding=\"UTF-8\"?>\n<output>\n";
-    AppendValue(text, &root, kIndentStep);
+    AppendValue(text, &root, kIndentStep, options.fieldsGiven ? &options.fields : nullptr);
     text += "</output>\n";
     return text;
 }

@@ -2,6 +2,7 @@
 
 #include <gtest/gtest.h>
 
+#include "Text.h"
 #include "autocli/AutoCli.h"
 
 namespace FrameworkTest {
@@ -10,6 +11,7 @@ namespace {
 using namespace Kalmor::MetaObj;
 using Kalmor::AutoCli::App::FindFormatter;
 using Kalmor::AutoCli::App::FormatOptions;
+using Kalmor::AutoCli::App::Formatters;
 
 std::string Format(const std::string& formatter, const MetaObject& root,
                    const FormatOptions& options = FormatOptions()) {
@@ -60,8 +62,7 @@ TEST(SimpleFormatter, TitledBlocksInDisplayOrderWithUnits) {
     options.fields = {"Count", "Hidden"};
     EXPECT_EQ(Format("simple", *info, options),
               "Cluster Information\n   Count: 2\n   Hidden: not listed\n");
-    EXPECT_EQ(Format("csv", *info, options), "Count,Hidden\n2,not listed\n");
-    EXPECT_NE(Format("json", *info, options).find("\"Enabled\":true"), std::string::npos);
+    EXPECT_EQ(Format("json", *info, options), "{\"Count\":2,\"Hidden\":\"not listed\"}\n");
 
     // A title names each element from its own fields; blocks are set apart by a blank line. A
     // reference to no field, and a lone %, stay as written; an empty value gets no unit.
@@ -100,12 +101,28 @@ TEST(TableFormatter, AlignedColumnsUnderHeaderAndRule) {
               "Name    Size\n------  ----\ndisk-b  1\n");
 }
 
+TEST(Formatters, RowsSayWhichHonourFieldsAndNoHeader) {
+    auto disks = MetaList::New(META_STRUCT);
+    disks->Add(Struct("Disk", "Name", MetaString::New("nm-x"), "Size", MetaInt::New(777), "Model",
+                      MetaString::New("m"), "Parts", Texts({"p"})));
+    FormatOptions options;
+    options.fieldsGiven = true;
+    options.fields = {"Size", "Parts", "Name"};
+    options.noHeader = true;
+    for (const auto& formatter : Formatters()) {
+        const std::string text = formatter.function(*disks, options);
+        EXPECT_EQ(text.find("Model") == std::string::npos, formatter.honoursFields) << text;
+        EXPECT_LT(text.find("777"), text.find("nm-x")) << text;
+        EXPECT_EQ(text.find("Name") == std::string::npos, formatter.honoursNoHeader) << text;
+    }
+}
+
 TEST(Formatters, BareBooleanIsSilentWhenTrueExceptInMachineFormats) {
     const std::vector<std::vector<std::string>> cases = {
         {"simple", "", "false\n"},
         {"table", "", "false\n"},
         {"json", "true\n", "false\n"},
-        {"csv", "value\ntrue\n", "value\nfalse\n"},
+        {"csv", "value\r\ntrue\r\n", "value\r\nfalse\r\n"},
     };
     for (const auto& entry : cases) {
         EXPECT_EQ(Format(entry[0], *MetaBool::New(true)), entry[1]) << entry[0];
@@ -133,12 +150,47 @@ TEST(CsvFormatter, QuotesAsRfc4180AndHasOneRowPerStructure) {
                       "Quote", MetaString::New("say \"hi\""), "Lines", MetaString::New("1\n2"));
     rows->Add(row);
     rows->Add(row);
-    const std::string line = "abc,\"a,b\",\"say \"\"hi\"\"\",\"1\n2\"\n", body = line + line;
-    EXPECT_EQ(Format("csv", *rows), "Plain,Comma,Quote,Lines\n" + body);
+    // A list cell is a JSON array, so that items holding ", " split back.
+    row->SetField("List", Texts({"a, b", "c"}), MetaStruct::_docEmpty);
+    const std::string line =
+        "abc,\"a,b\",\"say \"\"hi\"\"\",\"1\n2\",\"[\"\"a, b\"\",\"\"c\"\"]\"\r\n";
+    const std::string body = line + line;
+    EXPECT_EQ(Format("csv", *rows), "Plain,Comma,Quote,Lines,List\r\n" + body);
     FormatOptions noHeader;
     noHeader.noHeader = true;
     EXPECT_EQ(Format("csv", *rows, noHeader), body);
-    EXPECT_EQ(Format("csv", *Texts({"cluster", "x,y"})), "value\ncluster\n\"x,y\"\n");
+    EXPECT_EQ(Format("csv", *Texts({"cluster", "x,y"})), "value\r\ncluster\r\n\"x,y\"\r\n");
+}
+
+TEST(TableFormatter, PadsByDisplayWidthAndShowsControlsEscaped) {
+    using Kalmor::AutoCli::App::DisplayWidth;
+    using Kalmor::AutoCli::App::ScreenText;
+    const struct {
+        const char* text;
+        size_t width;
+        const char* shown;
+    } cases[] = {
+        {"\xE6\x97\xA5\xE6\x9C\xAC", 4, nullptr},  // CJK: two columns each
+        {"e\xCC\x81\xCC\xA3", 1, nullptr},         // combining marks: none
+        {"\xF0\x9F\x98\x80!", 3, nullptr},         // emoji
+        {"a\xFF\xE6\x97", 4, "a\xFF\xE6\\x97"},    // bad bytes: one column each
+        {"\x1b]0;t\x07", 6, "\\x1b]0;t\\x07"},     // C0 from the host
+        {"a\tb\r\n\x7f", 6, "a\\tb\\r\\n\\x7f"},   // tab, line ends, DEL
+        {"\xC2\x9B+\x9B+", 4, "\\u009b+\\x9b+"},   // C1, and as a stray byte
+    };
+    auto rows = MetaList::New(META_STRUCT);
+    for (const auto& entry : cases) {
+        EXPECT_EQ(DisplayWidth(entry.text), entry.width) << entry.text;
+        EXPECT_EQ(ScreenText(entry.text), entry.shown ? entry.shown : entry.text);
+        rows->Add(Struct("R", "Text", MetaString::New(entry.text), "End", MetaString::New("|")));
+    }
+    // Every "|" stands in the same column of the screen: after the widest text (12) and the gap.
+    const std::string table = Format("table", *rows);
+    for (size_t end = table.find("|\n"); end != std::string::npos;
+         end = table.find("|\n", end + 1)) {
+        const size_t start = table.rfind('\n', end) + 1;
+        EXPECT_EQ(DisplayWidth(table.substr(start, end - start)), 14u) << table.substr(start, end);
+    }
 }
 
 TEST(XmlFormatter, StableDocumentWithoutForbiddenCharacters) {
