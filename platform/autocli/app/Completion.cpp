@@ -84,12 +84,9 @@ std::vector<std::string> FieldNames(CommandSpec* command) {
         return names;
     }
     const auto outputSpec = command->GetOutputSpec();
-    std::shared_ptr<MetaObj::MetaObject> root = outputSpec ? outputSpec->GetRootObject() : nullptr;
-    if (root && root->GetType() == MetaObj::META_LIST) {
-        root = static_cast<const MetaObj::MetaList*>(root.get())->GetTemplate();
-    }
-    if (root && root->GetType() == MetaObj::META_STRUCT) {
-        for (const auto& field : static_cast<const MetaObj::MetaStruct*>(root.get())->GetFields()) {
+    if (const MetaObj::MetaStruct* structure =
+            ResultStructure(outputSpec ? outputSpec->GetRootObject().get() : nullptr)) {
+        for (const auto& field : structure->GetFields()) {
             names.push_back(field.name);
         }
     }
