@@ -78,8 +78,8 @@ struct World {
         traceFile = OrvaneCli::MeskNamespace::HostPath(OrvaneCli::MeskNamespace::TRACE_CONFIG_FILE);
         std::filesystem::create_directories(std::filesystem::path(traceFile).parent_path());
 
-        const std::string notify =
-            OrvaneCli::MeskNamespace::HostPath("/usr/lib/orvane/tavord/bin/notifyDatastore.py");
+        const std::string notify = OrvaneCli::MeskNamespace::HostShellPath(
+            "/usr/lib/orvane/tavord/bin/notifyDatastore.py");
         for (const char* event : {"PreUnmount", "FailedUnmount"}) {
             allowedShellLines.push_back(notify + " -t " + event + " -d meskDatastore");
         }

@@ -25,9 +25,10 @@ const std::string kMeskDatastoreName = "meskDatastore";
 }  // namespace
 
 void NotifyDatastore(const std::string& eventType, const std::string& datastoreName) {
-    // The values are passed unquoted: both come from this plug-in, never from the user.
-    const std::string command = HostPath("/usr/lib/orvane/tavord/bin/notifyDatastore.py") + " -t " +
-                                eventType + " -d " + datastoreName;
+    // The values are passed unquoted: both come from this plug-in, never from the user. The
+    // host root in front of the script's path is quoted, as it comes from the environment.
+    const std::string command = HostShellPath("/usr/lib/orvane/tavord/bin/notifyDatastore.py") +
+                                " -t " + eventType + " -d " + datastoreName;
     std::string scriptOutput;
     Kalmor::AutoCli::AutoCli_ShellCmd(command, scriptOutput, "");
 }

@@ -48,4 +48,23 @@ ok mesk cluster restore --boot
 sim calls
 expect_out_has '{"op":"RestoreClusterConfig","args":[true]'
 
+# The notification script's path lies below the host root, which may hold anything: the shell
+# must see the root as one literal word, run nothing of it, and run the script.
+MARK="$E2E_DIR/shell-ran"
+NOTIFY='"op":"/usr/lib/orvane/tavord/bin/notifyDatastore.py","args":["-t","%s","-d","meskDatastore"]'
+for prefix in "\$(touch $MARK)" "\`touch $MARK\`" "a;touch $MARK;" "a&touch $MARK&" \
+    "a|touch $MARK|" "my host/ root" "it's 'quoted'" 'say "a" \"' $'two\nlines\n'; do
+    case_ "leave below the host root '$prefix': the notifications run, nothing else does"
+    MESK_HOST_ROOT="$E2E_DIR/roots/$prefix"
+    mkdir -p "$MESK_HOST_ROOT" && rm -f "$MARK"
+    "$HOSTSIM" reset >/dev/null && "$HOSTSIM" fail LeaveCluster boom && ok mesk cluster new
+    run mesk cluster leave
+    expect_rc 1
+    expect_err "boom"
+    sim calls
+    expect_out_has "$(printf "$NOTIFY" PreUnmount)"
+    expect_out_has "$(printf "$NOTIFY" FailedUnmount)"
+    [ ! -e "$MARK" ] && _pass || _fail "the shell ran a command of the host root"
+done
+
 finish
