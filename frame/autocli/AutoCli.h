@@ -134,8 +134,11 @@ class KALMOR_API Command : public CommandSpec, public CallSpec::CallTarget {
 };
 
 // Runs a command line through /bin/sh -c, feeding it `input` on standard input, and stores
-// what it printed on standard output in `output`. Returns the exit status, or -1 when the
-// shell could not be run or was killed by a signal.
+// what it printed on standard output and standard error, interleaved, in `output`: nothing of
+// it reaches the caller's own streams. At most the first 1 MiB is kept; the rest is read and
+// dropped. Returns once the shell has exited, even when a process it started in the
+// background still holds its output open (what that one prints later is lost). Returns the
+// exit status, or -1 when the shell could not be run or waited for, or was killed by a signal.
 KALMOR_API int AutoCli_ShellCmd(const std::string& command, std::string& output,
                                 const std::string& input);
 

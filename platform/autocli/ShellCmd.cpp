@@ -3,9 +3,12 @@
 #include <poll.h>
 #include <signal.h>
 #include <spawn.h>
+#include <sys/ioctl.h>
+#include <sys/syscall.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <cerrno>
 
 #include "ShellCmdHook.h"
@@ -55,9 +58,43 @@ void CloseIfOpen(int& fd) {
     }
 }
 
-// Feeds `input` to the child's standard input while collecting its standard output, so that
-// neither side blocks on a full pipe.
-void Exchange(int toChild, int fromChild, const std::string& input, std::string& output) {
+// What is kept of the command's output: 1 MiB. The rest is read and dropped, so that a command
+// that prints without end neither fills our memory nor blocks on a full pipe.
+constexpr size_t kKeptOutputLimit = size_t{1} << 20;
+
+void Keep(std::string& output, const char* data, size_t size) {
+    if (output.size() < kKeptOutputLimit) {
+        output.append(data, std::min(size, kKeptOutputLimit - output.size()));
+    }
+}
+
+// Reads from the non-blocking pipe what is there now: with `all`, up to what it holds at this
+// moment (a writer that goes on cannot keep us reading); else one buffer. Closes it at end
+// of file or on an error.
+void ReadAvailable(int& fromChild, std::string& output, bool all) {
+    int pending = 0;
+    if (all && ioctl(fromChild, FIONREAD, &pending) != 0) {
+        pending = 0;
+    }
+    char buffer[65536];
+    do {
+        ssize_t n = read(fromChild, buffer, sizeof buffer);
+        if (n > 0) {
+            Keep(output, buffer, static_cast<size_t>(n));
+            pending -= static_cast<int>(n);
+        } else if (n == 0 || (errno != EINTR && errno != EAGAIN)) {
+            CloseIfOpen(fromChild);
+        } else if (errno == EAGAIN) {
+            return;
+        }
+    } while (fromChild >= 0 && pending > 0);
+}
+
+// Feeds `input` to the child's standard input while collecting what it prints, so that
+// neither side blocks on a full pipe, until the child itself exits: a process it left behind
+// that still holds the pipe does not hold us. Then takes what is left in the pipe. Returns the
+// child's exit status, or -1 when it was killed by a signal or could not be waited for.
+int Exchange(pid_t pid, int toChild, int fromChild, const std::string& input, std::string& output) {
     size_t written = 0;
     if (input.empty()) {
         CloseIfOpen(toChild);
@@ -65,21 +102,29 @@ void Exchange(int toChild, int fromChild, const std::string& input, std::string&
         // Partial writes instead of blocking while the child waits for us to read.
         fcntl(toChild, F_SETFL, fcntl(toChild, F_GETFL) | O_NONBLOCK);
     }
-    char buffer[4096];
-    while (fromChild >= 0) {
-        pollfd fds[2];
+    fcntl(fromChild, F_SETFL, fcntl(fromChild, F_GETFL) | O_NONBLOCK);
+    // Readable once the child has exited; without it (an old kernel), the wait is polled.
+    int exited = static_cast<int>(syscall(SYS_pidfd_open, pid, 0));
+    int status = 0;
+    pid_t waited = 0;
+    while (waited == 0) {
+        pollfd fds[3];
         nfds_t count = 0;
-        fds[count++] = pollfd{fromChild, POLLIN, 0};
-        if (toChild >= 0) {
-            fds[count++] = pollfd{toChild, POLLOUT, 0};
-        }
-        if (poll(fds, count, -1) < 0) {
-            if (errno == EINTR) {
-                continue;
-            }
+        const int readAt = fromChild >= 0 ? static_cast<int>(count) : -1;
+        if (fromChild >= 0) fds[count++] = pollfd{fromChild, POLLIN, 0};
+        const int writeAt = toChild >= 0 ? static_cast<int>(count) : -1;
+        if (toChild >= 0) fds[count++] = pollfd{toChild, POLLOUT, 0};
+        if (exited >= 0) fds[count++] = pollfd{exited, POLLIN, 0};
+        if (poll(fds, count, exited >= 0 ? -1 : 10) < 0 && errno != EINTR) {
+            // Cannot watch the pipes: closing them lets a blocked child go on to its end.
+            CloseIfOpen(toChild);
+            CloseIfOpen(fromChild);
+            do {
+                waited = waitpid(pid, &status, 0);
+            } while (waited < 0 && errno == EINTR);
             break;
         }
-        if (toChild >= 0 && (fds[1].revents & (POLLOUT | POLLERR | POLLHUP))) {
+        if (writeAt >= 0 && (fds[writeAt].revents & (POLLOUT | POLLERR | POLLHUP))) {
             ssize_t n = write(toChild, input.data() + written, input.size() - written);
             if (n > 0) {
                 written += static_cast<size_t>(n);
@@ -89,17 +134,20 @@ void Exchange(int toChild, int fromChild, const std::string& input, std::string&
                 CloseIfOpen(toChild);
             }
         }
-        if (fds[0].revents & (POLLIN | POLLERR | POLLHUP)) {
-            ssize_t n = read(fromChild, buffer, sizeof buffer);
-            if (n > 0) {
-                output.append(buffer, static_cast<size_t>(n));
-            } else if (n == 0 || (errno != EINTR && errno != EAGAIN)) {
-                CloseIfOpen(fromChild);
-            }
+        if (readAt >= 0 && (fds[readAt].revents & (POLLIN | POLLERR | POLLHUP))) {
+            ReadAvailable(fromChild, output, false);
         }
+        do {
+            waited = waitpid(pid, &status, WNOHANG);
+        } while (waited < 0 && errno == EINTR);
     }
+    if (fromChild >= 0) {
+        ReadAvailable(fromChild, output, true);
+    }
+    CloseIfOpen(exited);
     CloseIfOpen(toChild);
     CloseIfOpen(fromChild);
+    return waited == pid && WIFEXITED(status) ? WEXITSTATUS(status) : -1;
 }
 
 int RunShell(const std::string& command, std::string& output, const std::string& input) {
@@ -127,6 +175,7 @@ int RunShell(const std::string& command, std::string& output, const std::string&
     posix_spawn_file_actions_init(&actions);
     posix_spawn_file_actions_adddup2(&actions, toChild[0], STDIN_FILENO);
     posix_spawn_file_actions_adddup2(&actions, fromChild[1], STDOUT_FILENO);
+    posix_spawn_file_actions_adddup2(&actions, fromChild[1], STDERR_FILENO);
     posix_spawnattr_t attributes;
     posix_spawnattr_init(&attributes);
     posix_spawnattr_setsigmask(&attributes, &oldMask);
@@ -143,15 +192,7 @@ int RunShell(const std::string& command, std::string& output, const std::string&
 
     int result = -1;
     if (spawned == 0) {
-        Exchange(toChild[1], fromChild[0], input, output);
-        int status = 0;
-        pid_t waited;
-        do {
-            waited = waitpid(pid, &status, 0);
-        } while (waited < 0 && errno == EINTR);
-        if (waited == pid && WIFEXITED(status)) {
-            result = WEXITSTATUS(status);
-        }
+        result = Exchange(pid, toChild[1], fromChild[0], input, output);
     } else {
         close(toChild[1]);
         close(fromChild[0]);

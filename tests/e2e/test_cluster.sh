@@ -26,9 +26,11 @@ expect_eq "$(jq -r .cluster.uuid <<<"$OUT")" "$CLUSTER_UUID" "cluster UUID on th
 [[ "$CLUSTER_UUID" =~ ^[0-9a-f]{8}(-[0-9a-f]{4}){3}-[0-9a-f]{12}$ ]] && _pass ||
     _fail "no cluster UUID: '$CLUSTER_UUID'"
 
-case_ "leave, then get shows clustering disabled"
+case_ "leave, then get shows clustering disabled; a missing notification script is not seen"
+rm "$MESK_HOST_ROOT/usr/lib/orvane/tavord/bin/notifyDatastore.py"
 ok mesk cluster leave
 expect_out ""
+expect_err ""
 run mesk cluster get
 expect_rc 1
 expect_err "Mesk Clustering is not enabled on this host"
