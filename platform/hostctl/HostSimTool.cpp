@@ -1,6 +1,7 @@
 // hostsim: sets up, inspects and fault-injects the simulated host that the host-control
 // library serves. It shares the host with autocli through HOSTSIM_STATE and MESK_HOST_ROOT.
 #include <cerrno>
+#include <csignal>
 #include <cstdio>
 #include <cstdlib>
 #include <fstream>
@@ -350,6 +351,9 @@ int Main(int argc, char** argv) {
 }  // namespace
 
 int main(int argc, char** argv) {
+    // An ignored SIGCHLD inherited from whoever started us would make the scripts we run
+    // vanish before their exit status is read.
+    signal(SIGCHLD, SIG_DFL);
     std::cout.rdbuf(Output::StdoutBuffer());
     return Output::Finish("hostsim", Main(argc, argv));
 }

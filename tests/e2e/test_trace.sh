@@ -30,6 +30,11 @@ Number Of Files To Rotate: 3
 Maximum Trace File Size: 100 MB
 Log Urgent Traces To Syslog: false"
 
+case_ "set started with SIGCHLD ignored still reads the service script's status"
+_capture perl -e '$SIG{CHLD} = "IGNORE"; exec @ARGV' "$AUTOCLI" mesk trace set -f 5
+expect_rc 0
+expect_err ""
+
 case_ "reset keeps only the comments, so get shows the defaults"
 COMMENT=$(head -n 1 "$CONF")
 ok mesk trace set --reset true

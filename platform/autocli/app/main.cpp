@@ -1,4 +1,5 @@
 // autocli: loads the plug-ins, runs one command line and prints what it gave.
+#include <csignal>
 #include <cstdlib>
 #include <cstring>
 #include <string>
@@ -20,6 +21,9 @@ std::string DefaultPluginPath() {
 }  // namespace
 
 int main(int argc, char** argv) {
+    // An ignored SIGCHLD inherited from whoever started us would make the scripts we run
+    // vanish before their exit status is read.
+    signal(SIGCHLD, SIG_DFL);
     using namespace Kalmor::AutoCli;
 
     std::shared_ptr<NamespaceNode> root = Namespace::New();
