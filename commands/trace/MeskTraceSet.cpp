@@ -1,6 +1,7 @@
 #include "commands/trace/MeskTraceSet.h"
 
 #include <fstream>
+#include <sstream>
 
 #include "MeskConstants.h"
 #include "commands/common/HostPath.h"
@@ -117,27 +118,37 @@ void MeskTraceSet::ExecuteInternal(std::shared_ptr<Input> input, std::shared_ptr
     }
 
     const std::string configPath = HostPath(TRACE_CONFIG_FILE);
-    std::vector<std::string> oldLines;
+    std::string oldText;
     {
-        std::ifstream in(configPath);
+        std::ifstream in(configPath, std::ios::binary);
         if (!in.is_open()) {
             output->AddErrorMessage("Error opening Mesk Trace Config File for reading.");
             return;
         }
-        oldLines = ReadTraceLines(in);
+        std::ostringstream text;
+        text << in.rdbuf();
+        oldText = text.str();
+    }
+    std::istringstream oldLines(oldText);
+    std::string newText;
+    for (const auto& line : RewriteTraceLines(ReadTraceLines(oldLines), changes)) {
+        newText += line + '\n';
     }
 
-    // The file is truncated before it is written: a write that fails halfway leaves it
-    // damaged, and is reported like a file that could not be opened.
+    // The file is truncated before it is written. A write that fails halfway (a full file
+    // system) is reported like a file that could not be opened, and the old text is put back:
+    // it fits again in the blocks that the truncation freed, so the file is left as it was.
     {
-        std::ofstream out(configPath, std::ios::out | std::ios::trunc);
+        std::ofstream out(configPath, std::ios::out | std::ios::trunc | std::ios::binary);
         if (!out.is_open()) {
             output->AddErrorMessage("Error opening Mesk Trace Config File for writing.");
             return;
         }
-        for (const auto& line : RewriteTraceLines(oldLines, changes)) out << line << '\n';
+        out << newText;
         out.close();
         if (out.fail()) {
+            std::ofstream(configPath, std::ios::out | std::ios::trunc | std::ios::binary)
+                << oldText;
             output->AddErrorMessage("Error opening Mesk Trace Config File for writing.");
             return;
         }

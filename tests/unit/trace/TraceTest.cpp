@@ -1,6 +1,8 @@
 #include <stdlib.h>
+#include <sys/resource.h>
 
 #include <climits>
+#include <csignal>
 #include <filesystem>
 #include <fstream>
 #include <map>
@@ -163,8 +165,24 @@ TEST_F(TraceCommandTest, SetRestartsTheServiceAfterWritingTheFile) {
     fs::remove(ConfigPath());
     fs::create_directory(ConfigPath());
     runs.clear();
-    EXPECT_EQ(Outcome(*Run(*MeskTraceSet::New(), "numfiles=3")),
-              "Error opening Mesk Trace Config File for writing.; no result, incomplete");
+    const std::string cannotWrite =
+        "Error opening Mesk Trace Config File for writing.; no result, incomplete";
+    EXPECT_EQ(Outcome(*Run(*MeskTraceSet::New(), "numfiles=3")), cannotWrite);
+    // A write that fails after the truncation (past the file size limit here, as on a full
+    // file system) is reported alike and puts the old text back byte for byte.
+    fs::remove(ConfigPath());
+    const std::string old = DEFAULT_CONFIG + std::string("# no newline at the end");
+    WriteConfig(old);
+    rlimit saved{};
+    getrlimit(RLIMIT_FSIZE, &saved);
+    const rlimit small{4096, saved.rlim_max};
+    signal(SIGXFSZ, SIG_IGN);  // a write past the limit fails instead of killing us
+    setrlimit(RLIMIT_FSIZE, &small);
+    const std::string outcome =
+        Outcome(*Run(*MeskTraceSet::New(), "path=" + std::string(8192, 'p')));
+    setrlimit(RLIMIT_FSIZE, &saved);
+    EXPECT_EQ(outcome, cannotWrite);
+    EXPECT_EQ(ReadConfig(), old);
     EXPECT_EQ(runs, "");
 }
 
