@@ -1,7 +1,8 @@
 #!/bin/bash
 # Completion as a person meets it: each shell's adaptor (`autocli completion SHELL`) loaded in
 # a real interactive shell on a pseudo-terminal, a line typed and Tab pressed. bash always;
-# zsh and fish where they are installed. Help is wrapped to a terminal's width, and only there.
+# zsh and fish where they are installed. `__complete` itself over two plug-ins, one of them
+# unloadable. Help is wrapped to a terminal's width, and only there.
 . "$(dirname "$0")/lib.sh"
 
 BIN="$E2E_DIR/bin"
@@ -13,6 +14,7 @@ cd "$E2E_DIR/cwd"
 # The typed line | what the line must read after Tab ("!" before it: must not read)
 CASES='autocli mesk sto|autocli mesk storage
 autocli mesk storage list --formatter x|--formatter xml
+autocli --formatter=x|--formatter=xml
 autocli mesk storage list --fields Dev|--fields Device
 autocli mesk storage list --fields Device,Disp|--fields Device,Display\ Name
 autocli mesk storage list -d zz|!zzfile
@@ -40,6 +42,16 @@ for shell in bash zsh fish; do
         fi
     done <<<"$CASES"
 done
+
+case_ "__complete over both plug-ins; one that cannot be loaded stays silent"
+mkdir -p "$E2E_DIR/broken"
+echo "not a library" >"$E2E_DIR/broken/broken.so"
+PLUGINS="$E2E_DIR/broken:${MESK_TEST_PLUGIN_DIR:?}"
+AUTOCLI_PLUGIN_PATH="$PLUGINS" run __complete mesk o
+expect_rc 0
+expect_out "other
+:4"
+expect_err ""
 
 case_ "help is wrapped to the terminal's width, and whole in a pipe"
 _capture script -qec "stty cols 80; $AUTOCLI mesk policy setdefault --help" /dev/null
