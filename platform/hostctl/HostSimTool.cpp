@@ -4,6 +4,7 @@
 #include <csignal>
 #include <cstdio>
 #include <cstdlib>
+#include <cstring>
 #include <fstream>
 #include <iostream>
 #include <iterator>
@@ -40,10 +41,11 @@ Commands:
   load [--merge] FILE|-       replaces the host by such a document (from standard input for -);
                               with --merge, FILE holds only the keys to change (a JSON merge
                               patch over the current host)
-  fail OPERATION MESSAGE [--call N]
+  fail OPERATION [--] MESSAGE [--call N]
                               makes every call of OPERATION (only the Nth of each invocation
-                              with --call) throw MeskCtlException with MESSAGE
-  fail --clear                removes every injected failure
+                              with --call) throw MeskCtlException with MESSAGE (after --
+                              when it begins with a dash)
+  fail --clear [OPERATION]    removes every injected failure, or those of OPERATION
   fail --list                 prints the injected failures, one JSON object a line
   calls [--clear]             prints the host-control operations of the last invocation and
                               the host scripts it ran, in order, one JSON object a line;
@@ -156,7 +158,7 @@ std::string ReadInput(const std::string& file) {
                            std::istreambuf_iterator<char>());
     }
     std::ifstream in(file, std::ios::binary);
-    if (!in) throw std::runtime_error("cannot read " + file);
+    if (!in) throw std::runtime_error("cannot read " + file + ": " + std::strerror(errno));
     std::ostringstream text;
     text << in.rdbuf();
     return text.str();
@@ -176,10 +178,23 @@ int Load(const std::vector<std::string>& args) {
     return 0;
 }
 
-int Fail(const std::vector<std::string>& args) {
+// Refuses a name that no operation has, listing those that exist.
+void CheckOperation(const std::string& name) {
+    HostCtlSim::Operation operation;
+    if (HostCtlSim::FindOperation(name, &operation)) return;
+    std::string known;
+    for (const char* operationName : HostCtlSim::kOperationNames) {
+        known += (known.empty() ? "" : ", ") + std::string(operationName);
+    }
+    throw UsageError("unknown operation '" + name + "'; the operations are: " + known);
+}
+
+int Fail(std::vector<std::string> args) {
     Host host;
-    if (args.size() == 1 && args[0] == "--clear") {
-        host.Modify([&](HostRoot::Files&) { host.store.ClearFaults(); });
+    if (!args.empty() && args[0] == "--clear" && args.size() <= 2) {
+        const std::string op = args.size() == 2 ? args[1] : std::string();
+        if (!op.empty()) CheckOperation(op);
+        host.Modify([&](HostRoot::Files&) { host.store.ClearFaults(op); });
         return 0;
     }
     if (args.size() == 1 && args[0] == "--list") {
@@ -192,24 +207,27 @@ int Fail(const std::vector<std::string>& args) {
         }
         return 0;
     }
+    // A message that begins with a dash is almost always a misplaced option ("fail OP
+    // --clear"); one that really does must follow "--".
+    const bool marked = args.size() >= 2 && args[1] == "--";
+    if (marked) args.erase(args.begin() + 1);
+    if (!marked && args.size() >= 2 && !args[1].empty() && args[1][0] == '-') {
+        throw UsageError("'" + args[1] + "' is no message; to clear " + args[0] +
+                         "'s failures: hostsim fail --clear " + args[0] +
+                         "; a message that begins with a dash follows --");
+    }
     HostCtlSim::Fault fault;
     if (args.size() == 2) {
         fault.call = 0;
     } else if (args.size() == 4 && args[2] == "--call") {
         fault.call = Number(args[3], "--call", 1, 1000000000);
     } else {
-        throw UsageError("fail takes OPERATION MESSAGE [--call N], --clear or --list");
+        throw UsageError(
+            "fail takes OPERATION [--] MESSAGE [--call N], --clear [OPERATION] or --list");
     }
     fault.op = args[0];
     fault.message = args[1];
-    HostCtlSim::Operation operation;
-    if (!HostCtlSim::FindOperation(fault.op, &operation)) {
-        std::string known;
-        for (const char* name : HostCtlSim::kOperationNames) {
-            known += (known.empty() ? "" : ", ") + std::string(name);
-        }
-        throw UsageError("unknown operation '" + fault.op + "'; the operations are: " + known);
-    }
+    CheckOperation(fault.op);
     host.Modify([&](HostRoot::Files&) { host.store.SetFault(fault); });
     return 0;
 }

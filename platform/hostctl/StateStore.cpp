@@ -352,8 +352,14 @@ void StateStore::SetFault(const Fault& fault) {
     if (sqlite3_step(statement) != SQLITE_DONE) Fail("cannot write a failure");
 }
 
-void StateStore::ClearFaults() {
-    Exec("DELETE FROM fault");
+void StateStore::ClearFaults(const std::string& op) {
+    if (op.empty()) {
+        Exec("DELETE FROM fault");
+        return;
+    }
+    Use statement(Statement("DELETE FROM fault WHERE op = ?1"));
+    Bind(statement, 1, op);
+    if (sqlite3_step(statement) != SQLITE_DONE) Fail("cannot clear a failure");
 }
 
 }  // namespace HostCtlSim

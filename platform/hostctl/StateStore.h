@@ -91,7 +91,8 @@ class StateStore {
     void DeleteDisk(const std::string& uuid);
     void Replace(const Json& host);  // by a normalized document
     void SetFault(const Fault& fault);
-    void ClearFaults();
+    // Forgets the injected failures of `op`, or every one when `op` is empty.
+    void ClearFaults(const std::string& op = std::string());
 
   private:
     enum class Kind { kMissing, kHost, kOlderHost };

@@ -52,8 +52,9 @@ expect_rc 0
 expect_err_has "autocli: cannot load plug-in $BROKEN/broken.so: "
 
 case_ "no plug-ins at all"
-AUTOCLI_PLUGIN_PATH="$E2E_DIR/empty" run mesk
+AUTOCLI_PLUGIN_PATH="$E2E_DIR/empty:$E2E_DIR/none" run mesk
 expect_rc 2
-expect_err "autocli: 'mesk' is not a namespace or command; no commands are registered"
+expect_err "autocli: no plug-in was found in $E2E_DIR/empty, $E2E_DIR/none (AUTOCLI_PLUGIN_PATH, directories separated by colons, changes where)
+autocli: 'mesk' is not a namespace or command; no commands are registered"
 
 finish

@@ -53,6 +53,8 @@ done <<'TABLE'
 frobnicate|unknown command 'frobnicate'
 fail NoSuchOperation boom|unknown operation 'NoSuchOperation'
 fail GetDiskInfo boom --call 0|
+fail JoinCluster --clear|hostsim fail --clear JoinCluster
+load /nonexistent|cannot read /nonexistent: No such file or directory
 service mesktraced sleepy|
 TABLE
 sim --help
@@ -65,6 +67,10 @@ case_ "injected failures are listed and cleared"
 sim fail --list
 expect_out "$(printf '%s\n%s' '{"op":"GetDiskInfo","call":0,"message":"disk on fire"}' \
     '{"op":"JoinCluster","call":2,"message":"no quorum"}')"
+"$HOSTSIM" fail GetDiskInfo -- "-dash first"
+"$HOSTSIM" fail --clear GetDiskInfo
+sim fail --list
+expect_out '{"op":"JoinCluster","call":2,"message":"no quorum"}'
 "$HOSTSIM" fail --clear
 sim fail --list
 expect_out ""

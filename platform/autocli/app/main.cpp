@@ -28,15 +28,26 @@ int main(int argc, char** argv) {
 
     std::shared_ptr<NamespaceNode> root = Namespace::New();
     App::PluginReport report;
-    App::LoadPlugins(
-        App::PluginDirectories(std::getenv("AUTOCLI_PLUGIN_PATH"), DefaultPluginPath()), root,
-        report);
+    const std::vector<std::string> directories =
+        App::PluginDirectories(std::getenv("AUTOCLI_PLUGIN_PATH"), DefaultPluginPath());
+    App::LoadPlugins(directories, root, report);
     // A completion request runs on every key press: a broken plug-in must not scribble over
     // the command line being typed.
     const bool completing = argc > 1 && std::strcmp(argv[1], App::kCompleteWord) == 0;
     std::string problems;
     for (const auto& problem : report.problems) {
         problems += "autocli: " + problem + "\n";
+    }
+    // The completion scripts need no plug-in: they are printed at build time without any.
+    const bool scriptOnly = argc > 1 && std::strcmp(argv[1], "completion") == 0;
+    if (report.loaded.empty() && !scriptOnly) {
+        std::string searched;
+        for (const auto& directory : directories) {
+            searched += (searched.empty() ? "" : ", ") + directory;
+        }
+        problems += "autocli: no plug-in was found in " +
+                    (searched.empty() ? std::string("any directory") : searched) +
+                    " (AUTOCLI_PLUGIN_PATH, directories separated by colons, changes where)\n";
     }
     if (!completing) {
         Output::Err(problems);
