@@ -175,13 +175,19 @@ void SimInfo::SetPreferredFaultDomain(const std::string& name) {
     });
 }
 
+// "address:port", with an IPv6 address in brackets so that address and port can be told apart.
+static std::string Endpoint(const std::string& ip, int port) {
+    const std::string address = ip.find(':') == std::string::npos ? ip : "[" + ip + "]";
+    return address + ":" + std::to_string(port);
+}
+
 void SimInfo::GetUnicastWitnesses(std::vector<std::string>& witnesses) {
     Serve(host_, Operation::GetUnicastWitnesses, Json::array(), [&] {
         witnesses.clear();
         for (const Json& entry : Store().ReadSection("unicastAgents")) {
             Agent agent;
             if (ParseAgent(entry, agent) && agent.witness) {
-                witnesses.push_back(agent.ip + ":" + std::to_string(agent.port));
+                witnesses.push_back(Endpoint(agent.ip, agent.port));
             }
         }
     });
@@ -204,8 +210,8 @@ void SimInfo::AddUnicastAgent(const std::string& nodeUuid, bool isWitness, bool 
                     Agent agent;
                     if (ParseAgent(entry, agent) && agent.port == port &&
                         LowerCase(agent.uuid) == LowerCase(nodeUuid) && SameAddress(agent.ip, ip)) {
-                        Refuse("The unicast agent " + nodeUuid + " at " + ip + ":" +
-                               std::to_string(port) + " is already configured");
+                        Refuse("The unicast agent " + nodeUuid + " at " + Endpoint(ip, port) +
+                               " is already configured");
                     }
                 }
                 agents.push_back(nodeUuid + ";" + (isWitness ? "1" : "0") + ";" +
@@ -246,7 +252,7 @@ bool SimInfo::RemoveUnicastAgent(const std::string& nodeUuid, const MeskIpAddres
                     return;
                 }
             }
-            Refuse("No unicast agent " + nodeUuid + " at " + ip + ":" + std::to_string(port));
+            Refuse("No unicast agent " + nodeUuid + " at " + Endpoint(ip, port));
         });
         return witness;
     });

@@ -1,4 +1,6 @@
 // The simulated host's answers about disks and disk groups.
+#include <algorithm>
+
 #include "SimInfo.h"
 
 namespace HostCtlSim {
@@ -187,6 +189,11 @@ void SimInfo::AddDisks(const std::string& ssd, const std::vector<std::string>& d
             if (members + disks.size() > kMaxCapacityDisks) {
                 Refuse("A disk group holds at most " + std::to_string(kMaxCapacityDisks) +
                        " capacity disks");
+            }
+            for (auto name = disks.begin(); name != disks.end(); ++name) {
+                if (std::find(disks.begin(), name, *name) != name) {
+                    Refuse("Disk " + Quoted(*name) + " is given more than once");
+                }
             }
             for (const std::string& name : disks) {
                 Disk disk = DeviceNamed(store, name);

@@ -71,6 +71,10 @@ TEST_F(SimHost, RefusalsNameTheFaultAndChangeNothing) {
         {"not an SSD", [](auto& i) { i.AddDisks(kHdd2, {kHdd3}); }},
         // The first disk would do: nothing of the request may be applied.
         {"already in use", [&](auto& i) { i.AddDisks(kSsd, secondInUse); }},
+        {"is given more than once",
+         [](auto& i) {
+             i.AddDisks(kSsd, {kHdd2, kHdd2});
+         }},
         {"No capacity disk", [](auto& i) { i.AddDisks(kSsd, {}); }},
         {"evacuation mode", [](auto& i) { i.RemoveDisk(kHdd1, "noAction"); }},
         {"not in use", [](auto& i) { i.RemoveDisk(kHdd2, ""); }},
@@ -86,6 +90,11 @@ TEST_F(SimHost, RefusalsNameTheFaultAndChangeNothing) {
         {"Invalid node UUID",
          [&](auto& i) { i.AddUnicastAgent("u1", false, true, v4, 1, false, ""); }},
         {"No unicast agent", [&](auto& i) { i.RemoveUnicastAgent(kClusterUuid, v4, 1); }},
+        // An IPv6 address is bracketed, so that its last group cannot be read as the port.
+        {"at [fe80::10]:2000",
+         [](auto& i) {
+             i.RemoveUnicastAgent(kClusterUuid, MeskIpAddress(Ipv6Address("fe80::10")), 2000);
+         }},
         {"cannot be empty", [](auto& i) { i.SetDatastoreName(""); }},
         {"Unknown policy class", [](auto& i) { i.GetDefaultPolicy("VDISK"); }},
         {"throttle", [](auto& i) { i.SetResyncThrottle(-1); }},
