@@ -76,6 +76,22 @@ if [ -r "$state_file" ]; then
         esac
     done <"$state_file"
 fi
+# As the real service reports the directory it uses, a restart takes the configured volume
+# (MESKTRACED_VOLUME) as the last selected one when it is a directory below the host's root;
+# otherwise the last selection stays.
+select_volume() {
+    config="$root@CONFIG@"
+    [ -r "$config" ] || return 0
+    volume=$(sed -n 's/^MESKTRACED_VOLUME=//p' "$config" | tail -n 1 | tr -d '"')
+    [ -n "$volume" ] && [ -d "$root$volume" ] || return 0
+    new_config=$(mktemp "$config.XXXXXX") || return 0
+    VOLUME=$volume awk '
+        /^MESKTRACED_LAST_SELECTED_VOLUME=/ { if (!done) print "MESKTRACED_LAST_SELECTED_VOLUME=\"" ENVIRON["VOLUME"] "\""; done = 1; next }
+        { print }
+        END { if (!done) print "MESKTRACED_LAST_SELECTED_VOLUME=\"" ENVIRON["VOLUME"] "\"" }' \
+        "$config" >"$new_config" && chmod 644 "$new_config" && mv "$new_config" "$config" ||
+        rm -f "$new_config"
+}
 save() {
     new_state=$(mktemp "$state_file.XXXXXX") &&
         printf 'state=%s\nstatus_fails=%s\nrestart_failures=%s\n' \
@@ -110,6 +126,7 @@ restart)
     fi
     state=running
     save
+    select_volume
     record '"exit":0'
     exit 0
     ;;
@@ -133,6 +150,8 @@ exit 0
 std::string WithCommon(const char* script) {
     std::string text(script);
     text.replace(text.find("@COMMON@"), 8, kScriptCommon + 1);
+    const size_t config = text.find("@CONFIG@");
+    if (config != std::string::npos) text.replace(config, 8, kTraceConfigPath);
     return text;
 }
 

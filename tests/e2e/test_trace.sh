@@ -30,6 +30,12 @@ Number Of Files To Rotate: 3
 Maximum Trace File Size: 100 MB
 Log Urgent Traces To Syslog: false"
 
+case_ "after a restart the service reports the configured volume when it exists on the host"
+mkdir -p "$MESK_HOST_ROOT/vol/traces"
+ok mesk trace set -f 3
+ok mesk trace get --fields "MESK Traces Directory"
+expect_out "MESK Traces Directory: /vol/traces"
+
 case_ "set started with SIGCHLD ignored still reads the service script's status"
 _capture perl -e '$SIG{CHLD} = "IGNORE"; exec @ARGV' "$AUTOCLI" mesk trace set -f 5
 expect_rc 0
