@@ -27,7 +27,7 @@ case_ "a command's help"
 ok mesk other hello -h
 expect_out_has "  -c, --count <integer>  How many times to greet (0-512)."
 
-case_ "an exception from a plug-in's tree or specs, wherever autocli reaches them"
+case_ "an exception from a plug-in's tree or declarations, wherever autocli reaches them"
 while read -r status words; do
     # shellcheck disable=SC2086
     OTHER_PLUGIN_THROW=1 run $words

@@ -1,6 +1,6 @@
 // A second plug-in for tests: `mesk other hello`, which greets --name, so that the framework's
 // loading, versions and help can be driven end to end beside the real plug-in. With
-// OTHER_PLUGIN_THROW set, the command's specs and the listing of `mesk other` throw, as a
+// OTHER_PLUGIN_THROW set, the command's parameter declaration and the listing of `mesk other` throw, as a
 // broken plug-in's tree would.
 #include <cstdlib>
 #include <memory>
@@ -36,7 +36,7 @@ class OtherHello : public virtual Command {
     }
 
     std::shared_ptr<InputSpec> GetInputSpecInternal() override {
-        ThrowIfAsked("spec");
+        ThrowIfAsked("parameters");
         auto spec = InputSpec::New();
         auto name = ParameterSpec::New("name", PARAM_STRING);
         name->SetShortName("n");
