@@ -240,8 +240,8 @@ RunResult Dispatch(const std::vector<std::string>& words,
 }  // namespace
 
 // Plug-ins' code runs not only in a command's execution but wherever the tree is rendered
-// (help, listings, the reference and completion build the commands' input and output descriptions): whatever it
-// throws is caught here, once for all of them.
+// (help, listings, the reference and completion build the commands' input and output
+// descriptions): whatever it throws is caught here, once for all of them.
 RunResult Run(const std::vector<std::string>& words, const std::shared_ptr<NamespaceNode>& root) {
     std::shared_ptr<NamespaceNode> node = root;
     std::string what;
