@@ -1,7 +1,7 @@
 // A second plug-in for tests: `mesk other hello`, which greets --name, so that the framework's
 // loading, versions and help can be driven end to end beside the real plug-in. With
-// OTHER_PLUGIN_THROW set, the command's parameter declaration and the listing of `mesk other` throw, as a
-// broken plug-in's tree would.
+// OTHER_PLUGIN_THROW set, the command's parameter declaration and the listing of `mesk other`
+// throw, as a broken plug-in's tree would.
 #include <cstdlib>
 #include <memory>
 #include <stdexcept>

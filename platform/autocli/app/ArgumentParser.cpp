@@ -234,8 +234,11 @@ std::string CheckDeclarations(const InputSpec& spec) {
 }  // namespace
 
 std::vector<std::string> GlobalOptionNames() {
-    return {"--help",      "--list-commands", "--reference", "--debug",
-            "--no-header", "--formatter",     "--fields",    "--version"};
+    std::vector<std::string> names;
+    for (const auto& option : kGlobalOptions) {
+        if (option.name[1] == '-') names.push_back(option.name);
+    }
+    return names;
 }
 
 bool TakeGlobalOption(const std::vector<std::string>& words, size_t& index, GlobalOptions& globals,

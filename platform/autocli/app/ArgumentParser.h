@@ -26,6 +26,19 @@ struct GlobalOptions {
     std::set<std::string> given;  // the long names of the options above that were given
 };
 
+// autocli's own options, as TakeGlobalOption reads them (and --version, which main answers
+// before any command). Those marked `afterCommand` may also follow a command.
+struct GlobalOption {
+    const char* name;
+    bool takesValue;
+    bool afterCommand;
+};
+inline constexpr GlobalOption kGlobalOptions[] = {
+    {"--formatter", true, true},   {"--fields", true, true},    {"--no-header", false, true},
+    {"--debug", false, true},      {"--help", false, true},     {"--list-commands", false, false},
+    {"--reference", false, false}, {"--version", false, false}, {"-h", false, true},
+};
+
 // The long names of the global options, for suggestions.
 std::vector<std::string> GlobalOptionNames();
 

@@ -35,13 +35,9 @@ RunResult UsageError(RunResult result, const NamespaceNode* node, const std::str
 // Refuses --fields names that the command's result does not have, before the command runs.
 std::string CheckFields(CommandSpec& command, const std::vector<std::string>& fields) {
     auto outputSpec = command.GetOutputSpec();
-    const MetaObj::MetaStruct* structure = ResultStructure(outputSpec->GetRootObject().get());
-    if (structure == nullptr) {
+    const std::vector<std::string> known = FieldNames(outputSpec->GetRootObject().get());
+    if (known.empty()) {
         return std::string();
-    }
-    std::vector<std::string> known;
-    for (const auto& field : structure->GetFields()) {
-        known.push_back(field.name);
     }
     for (const auto& name : fields) {
         if (std::find(known.begin(), known.end(), name) == known.end()) {

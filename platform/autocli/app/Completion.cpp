@@ -3,6 +3,7 @@
 
 #include <set>
 
+#include "ArgumentParser.h"
 #include "Formatter.h"
 
 namespace Kalmor {
@@ -17,20 +18,6 @@ namespace {
 bool StartsWith(const std::string& text, const std::string& prefix) {
     return text.compare(0, prefix.size(), prefix) == 0;
 }
-
-// autocli's own options, as TakeGlobalOption reads them. Those marked `afterCommand` are
-// offered after a command too, where the parser also takes them.
-struct GlobalOption {
-    const char* name;
-    bool takesValue;
-    bool afterCommand;
-};
-
-const GlobalOption kGlobalOptions[] = {
-    {"--formatter", true, true},   {"--fields", true, true},    {"--no-header", false, true},
-    {"--debug", false, true},      {"--help", false, true},     {"--list-commands", false, false},
-    {"--reference", false, false}, {"--version", false, false}, {"-h", false, true},
-};
 
 // The global option that `word` names, with or without "=value".
 const GlobalOption* FindGlobalOption(const std::string& word) {
@@ -78,19 +65,9 @@ bool NamesAPath(const ParameterSpec& parameter) {
 }
 
 // The field names of the command's result, as --fields takes them.
-std::vector<std::string> FieldNames(CommandSpec* command) {
-    std::vector<std::string> names;
-    if (command == nullptr) {
-        return names;
-    }
-    const auto outputSpec = command->GetOutputSpec();
-    if (const MetaObj::MetaStruct* structure =
-            ResultStructure(outputSpec ? outputSpec->GetRootObject().get() : nullptr)) {
-        for (const auto& field : structure->GetFields()) {
-            names.push_back(field.name);
-        }
-    }
-    return names;
+std::vector<std::string> CommandFieldNames(CommandSpec* command) {
+    const auto outputSpec = command ? command->GetOutputSpec() : nullptr;
+    return FieldNames(outputSpec ? outputSpec->GetRootObject().get() : nullptr);
 }
 
 // What the last complete word left waiting for a value.
@@ -191,7 +168,7 @@ class Completer {
         const size_t comma = typed.rfind(',');
         const std::string chosen = comma == std::string::npos ? "" : typed.substr(0, comma + 1);
         const std::string chosenList = "," + chosen;
-        for (const auto& name : FieldNames(command_)) {
+        for (const auto& name : CommandFieldNames(command_)) {
             if (chosenList.find("," + name + ",") == std::string::npos) {
                 Offer(prefix + chosen + name);
             }

@@ -201,6 +201,16 @@ const MetaStruct* ResultStructure(const MetaObject* root) {
     return nullptr;
 }
 
+std::vector<std::string> FieldNames(const MetaObject* root) {
+    std::vector<std::string> names;
+    if (const MetaStruct* structure = ResultStructure(root)) {
+        for (const auto& field : structure->GetFields()) {
+            names.push_back(field.name);
+        }
+    }
+    return names;
+}
+
 bool BuildGrid(const MetaObject& root, const OutputLayout& layout, CellStyle style, Grid& grid) {
     std::vector<const MetaStruct*> elements;
     const MetaStruct* model = nullptr;

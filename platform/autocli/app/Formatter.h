@@ -85,6 +85,10 @@ bool BuildGrid(const MetaObj::MetaObject& root, const OutputLayout& layout, Cell
 // top-level structure, or the element template of a list of structures; nullptr otherwise.
 const MetaObj::MetaStruct* ResultStructure(const MetaObj::MetaObject* root);
 
+// The field names of ResultStructure(root), in order: what --fields may name. Empty when the
+// result is no structure.
+std::vector<std::string> FieldNames(const MetaObj::MetaObject* root);
+
 // A result that is not a structure or a list of structures, as "simple" and "table" print
 // it: a text or integer on one line, a list of texts one per line, and a boolean as nothing
 // for true and "false" for false (scripts test the exit status; a bare "true" would only

@@ -238,15 +238,10 @@ std::string RenderCommandHelp(CommandSpec& command, const CallSpec::InputSpec& s
     }
     // What --fields may name: the fields of the structure the command returns.
     auto outputSpec = command.GetOutputSpec();
-    if (const MetaObj::MetaStruct* structure =
-            ResultStructure(outputSpec ? outputSpec->GetRootObject().get() : nullptr)) {
-        std::vector<std::string> names;
-        for (const auto& field : structure->GetFields()) {
-            names.push_back(field.name);
-        }
-        if (!names.empty()) {
-            text += "\nOutput fields: " + Join(names, ", ") + "\n";
-        }
+    const std::vector<std::string> names =
+        FieldNames(outputSpec ? outputSpec->GetRootObject().get() : nullptr);
+    if (!names.empty()) {
+        text += "\nOutput fields: " + Join(names, ", ") + "\n";
     }
     return text;
 }

@@ -8,6 +8,7 @@
 #include "CommandLine.h"
 #include "Output.h"
 #include "PluginLoader.h"
+#include "Text.h"
 
 namespace {
 
@@ -41,10 +42,7 @@ int main(int argc, char** argv) {
     // The completion scripts need no plug-in: they are printed at build time without any.
     const bool scriptOnly = argc > 1 && std::strcmp(argv[1], "completion") == 0;
     if (report.loaded.empty() && !scriptOnly) {
-        std::string searched;
-        for (const auto& directory : directories) {
-            searched += (searched.empty() ? "" : ", ") + directory;
-        }
+        const std::string searched = App::Join(directories, ", ");
         problems += "autocli: no plug-in was found in " +
                     (searched.empty() ? std::string("any directory") : searched) +
                     " (AUTOCLI_PLUGIN_PATH, directories separated by colons, changes where)\n";
