@@ -5,7 +5,10 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <cerrno>
+#include <charconv>
+#include <cstring>
 #include <ctime>
 #include <stdexcept>
 
@@ -14,12 +17,6 @@ namespace HostCtlSim {
 const char* const kCallLogPath = "/var/log/hostsim/calls.jsonl";
 
 namespace {
-
-int64_t Now() {
-    timespec now{};
-    clock_gettime(CLOCK_REALTIME, &now);
-    return int64_t(now.tv_sec) * 1000000000 + now.tv_nsec;
-}
 
 // The log file, open and locked (exclusively to write it); -1 when it cannot be had.
 int OpenLocked(const HostRoot& root, bool writing) {
@@ -50,86 +47,218 @@ int OpenLocked(const HostRoot& root, bool writing) {
     return fd;
 }
 
+// Whether `text` is its own JSON text: printable ASCII without a quote or a backslash. Looked
+// at eight bytes at a time, as most texts logged are UUIDs and names.
+bool IsPlain(const std::string& text) {
+    const uint64_t ones = 0x0101010101010101, highs = ones * 0x80;
+    auto hasZero = [&](uint64_t word) { return (word - ones) & ~word & highs; };
+    auto hasSpecial = [&](uint64_t word) {
+        return ((word - ones * 0x20) & ~word & highs) | (word & highs) |
+               hasZero(word ^ (ones * 0x7f)) | hasZero(word ^ (ones * '"')) |
+               hasZero(word ^ (ones * '\\'));
+    };
+    size_t i = 0;
+    for (; i + 8 <= text.size(); i += 8) {
+        uint64_t word;
+        std::memcpy(&word, text.data() + i, 8);
+        if (hasSpecial(word)) return false;
+    }
+    uint64_t word = ones * 'a';  // the rest, padded with a plain character
+    std::memcpy(&word, text.data() + i, text.size() - i);
+    return !hasSpecial(word);
+}
+
+template <size_t N>
+char* Copy(char* out, const char (&text)[N]) {
+    std::memcpy(out, text, N - 1);
+    return out + N - 1;
+}
+
 }  // namespace
 
-// Appends JSON text to the log. Most arguments are UUIDs and names, texts that JSON takes as
-// they are: those are copied; everything else goes through nlohmann's own serializer (the one
-// that dump() makes anew for each value), made once for the whole log.
+// The JSON text of what is not plain, made by nlohmann's own serializer (the one that dump()
+// makes anew for each value), made once for the whole log.
 class CallLog::Writer {
   public:
-    explicit Writer(std::string& text)
-        : text_(text),
-          serializer_(nlohmann::detail::output_adapter<char, std::string>(text), ' ',
+    Writer()
+        : serializer_(nlohmann::detail::output_adapter<char, std::string>(text_), ' ',
                       Json::error_handler_t::replace) {}
 
-    void Append(const Json& value) {
-        if (value.is_array()) {
-            text_ += '[';
-            for (size_t i = 0; i < value.size(); ++i) {
-                if (i > 0) text_ += ',';
-                Append(value[i]);
-            }
-            text_ += ']';
-        } else if (value.is_string() && IsPlain(value.get_ref<const std::string&>())) {
-            text_ += '"';
-            text_ += value.get_ref<const std::string&>();
-            text_ += '"';
-        } else {
-            serializer_.dump(value, false, false, 0);
-        }
+    const std::string& Text(const Json& value) {
+        text_.clear();
+        serializer_.dump(value, false, false, 0);
+        return text_;
     }
 
   private:
-    // Printable ASCII without a quote or backslash: its JSON text is itself.
-    static bool IsPlain(const std::string& text) {
-        for (char c : text) {
-            if (c < 0x20 || c > 0x7e || c == '"' || c == '\\') return false;
-        }
-        return true;
-    }
-
-    std::string& text_;
+    std::string text_;
     nlohmann::detail::serializer<Json> serializer_;
 };
 
-CallLog::CallLog() : writer_(std::make_unique<Writer>(text_)) {}
+CallLog::CallLog() : writer_(std::make_unique<Writer>()) {}
 CallLog::~CallLog() = default;
 
-void CallLog::Record(Operation op, const Json& args) {
+char* CallLog::Room(size_t bytes) {
+    if (blocks_.empty() || blocks_.back().capacity - blocks_.back().size < bytes) {
+        // What is written stays where it is: a block that is full is followed by another.
+        size_t capacity = std::max(bytes, kBlockSize);
+        blocks_.push_back({std::unique_ptr<char[]>(new char[capacity]), 0, capacity});
+    }
+    return blocks_.back().data.get() + blocks_.back().size;
+}
+
+void CallLog::Wrote(size_t bytes) {
+    blocks_.back().size += bytes;
+    length_ += bytes;
+}
+
+void CallLog::Put(const char* data, size_t size) {
+    std::memcpy(Room(size), data, size);
+    Wrote(size);
+}
+
+char* CallLog::AppendTime(char* out) {
+    // The time in nanoseconds since the epoch: the seconds, which seldom change from one call
+    // to the next and whose text is kept, then the nanoseconds in nine digits.
+    timespec now{};
+    clock_gettime(CLOCK_REALTIME, &now);
+    if (now.tv_sec != second_ || secondText_[0] == '\0') {
+        second_ = now.tv_sec;
+        *std::to_chars(secondText_, secondText_ + sizeof secondText_ - 1, second_).ptr = '\0';
+    }
+    size_t length = std::strlen(secondText_);
+    std::memcpy(out, secondText_, length);
+    out += length;
+    static const char kPairs[] =
+        "00010203040506070809101112131415161718192021222324252627282930313233343536373839"
+        "40414243444546474849505152535455565758596061626364656667686970717273747576777879"
+        "8081828384858687888990919293949596979899";
+    auto nanoseconds = static_cast<uint32_t>(now.tv_nsec);
+    for (int i = 7; i >= 1; i -= 2) {
+        std::memcpy(out + i, kPairs + 2 * (nanoseconds % 100), 2);
+        nanoseconds /= 100;
+    }
+    out[0] = char('0' + nanoseconds);
+    return out + 9;
+}
+
+void CallLog::Record(Operation op, CallArgs args) {
     // {"time":..., "op":..., "args":[...], "error":...}, the form of the scripts' log. Operation
     // names are plain identifiers and need no escaping.
-    if (!text_.empty()) text_ += "}\n";
-    text_ += "{\"time\":";
-    text_ += std::to_string(Now());
-    text_ += ",\"op\":\"";
-    text_ += OperationName(op);
-    text_ += "\",\"args\":";
-    writer_->Append(args);
+    const char* name = OperationName(op);
+    size_t nameLength = std::strlen(name);
+    bool first = length_ == 0;
+    char* start = Room(64 + nameLength);
+    char* out = start;
+    if (!first) out = Copy(out, "}\n");
+    out = Copy(out, "{\"time\":");
+    out = AppendTime(out);
+    out = Copy(out, ",\"op\":\"");
+    std::memcpy(out, name, nameLength);
+    out = Copy(out + nameLength, "\",\"args\":[");
+    Wrote(size_t(out - start));
+    first = true;
+    for (const CallArg& arg : args) {
+        if (!first) Put(",", 1);
+        first = false;
+        Append(arg);
+    }
+    Put("]", 1);
+}
+
+void CallLog::Append(const CallArg& arg) {
+    switch (arg.kind_) {
+        case CallArg::Kind::kText:
+            Append(*arg.text_);
+            break;
+        case CallArg::Kind::kFlag:
+            if (arg.number_ != 0) {
+                Put("true", 4);
+            } else {
+                Put("false", 5);
+            }
+            break;
+        case CallArg::Kind::kSigned:
+        case CallArg::Kind::kUnsigned: {
+            char* start = Room(24);
+            char* end = arg.kind_ == CallArg::Kind::kSigned
+                            ? std::to_chars(start, start + 24, int64_t(arg.number_)).ptr
+                            : std::to_chars(start, start + 24, arg.number_).ptr;
+            Wrote(size_t(end - start));
+            break;
+        }
+        case CallArg::Kind::kTexts:
+            Put("[", 1);
+            for (size_t i = 0; i < arg.texts_->size(); ++i) {
+                if (i > 0) Put(",", 1);
+                Append((*arg.texts_)[i]);
+            }
+            Put("]", 1);
+            break;
+        case CallArg::Kind::kJson:
+            Append(*arg.json_);
+            break;
+    }
+}
+
+void CallLog::Append(const std::string& text) {
+    if (!IsPlain(text)) {
+        const std::string& json = writer_->Text(text);
+        Put(json.data(), json.size());
+        return;
+    }
+    char* out = Room(text.size() + 2);
+    out[0] = '"';
+    std::memcpy(out + 1, text.data(), text.size());
+    out[text.size() + 1] = '"';
+    Wrote(text.size() + 2);
+}
+
+void CallLog::Append(const Json& value) {
+    if (value.is_array()) {
+        Put("[", 1);
+        for (size_t i = 0; i < value.size(); ++i) {
+            if (i > 0) Put(",", 1);
+            Append(value[i]);
+        }
+        Put("]", 1);
+    } else if (value.is_string()) {
+        Append(value.get_ref<const std::string&>());
+    } else {
+        const std::string& json = writer_->Text(value);
+        Put(json.data(), json.size());
+    }
 }
 
 void CallLog::NoteError(const std::string& message) {
-    if (text_.empty()) return;
-    text_ += ",\"error\":";
-    writer_->Append(message);
+    if (length_ == 0) return;
+    Put(",\"error\":", 9);
+    Append(message);
 }
 
 void CallLog::Write(const HostRoot& root) {
-    if (text_.empty()) return;
-    text_ += "}\n";
+    if (length_ == 0) return;
+    Put("}\n", 2);
     int fd = OpenLocked(root, true);
     if (fd < 0) return;
     // Written over the last log and then cut to its length, never emptied first: ext4 takes
     // a file cut to nothing and written again for a replaced file and starts writing it to the
     // disk at close, which each invocation would wait for.
     size_t done = 0;
-    while (done < text_.size()) {
-        ssize_t written = pwrite(fd, text_.data() + done, text_.size() - done, off_t(done));
-        if (written < 0 && errno == EINTR) continue;
-        if (written <= 0) break;
-        done += static_cast<size_t>(written);
+    for (const Block& block : blocks_) {
+        size_t written = 0;
+        while (written < block.size) {
+            ssize_t got =
+                pwrite(fd, block.data.get() + written, block.size - written, off_t(done + written));
+            if (got < 0 && errno == EINTR) continue;
+            if (got <= 0) break;
+            written += static_cast<size_t>(got);
+        }
+        done += written;
+        if (written < block.size) break;
     }
     // A log that could not be written whole is emptied rather than left mixed with the last.
-    bool whole = done == text_.size() && ftruncate(fd, off_t(done)) == 0;
+    bool whole = done == length_ && ftruncate(fd, off_t(done)) == 0;
     if (!whole) whole = ftruncate(fd, 0) == 0;
     close(fd);
 }

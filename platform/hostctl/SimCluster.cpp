@@ -85,22 +85,21 @@ void EnterCluster(StateStore& store, const std::string& clusterUuid, bool witnes
 }  // namespace
 
 const MeskClusterConfig& SimInfo::GetClusterConfig() {
-    return Serve(host_, Operation::GetClusterConfig, Json::array(),
-                 [&]() -> const MeskClusterConfig& {
-                     Json cluster = Store().ReadSection("cluster");
-                     config_.enabled = cluster["enabled"];
-                     config_.clusterUuid = cluster["uuid"];
-                     return config_;
-                 });
+    return Serve(host_, Operation::GetClusterConfig, {}, [&]() -> const MeskClusterConfig& {
+        Json cluster = Store().ReadSection("cluster");
+        config_.enabled = cluster["enabled"];
+        config_.clusterUuid = cluster["uuid"];
+        return config_;
+    });
 }
 
 bool SimInfo::IsWitness() {
-    return Serve(host_, Operation::IsWitness, Json::array(),
+    return Serve(host_, Operation::IsWitness, {},
                  [&] { return Store().ReadSection("cluster")["witness"].get<bool>(); });
 }
 
 MeskConfigGeneration SimInfo::GetConfigGeneration() {
-    return Serve(host_, Operation::GetConfigGeneration, Json::array(), [&] {
+    return Serve(host_, Operation::GetConfigGeneration, {}, [&] {
         Json g = Store().ReadSection("cluster")["configGeneration"];
         MeskConfigGeneration generation;
         generation.uuid = g["uuid"];
@@ -113,8 +112,8 @@ MeskConfigGeneration SimInfo::GetConfigGeneration() {
 void SimInfo::JoinCluster(const Uuid& clusterUuid, bool witnessNode,
                           const std::string& preferredFaultDomain, bool wait, int32_t flags) {
     std::string uuid = host_.HostBackend::MeskUuidToString(clusterUuid);
-    Serve(host_, Operation::JoinCluster,
-          Json::array({uuid, witnessNode, preferredFaultDomain, wait, flags}), [&] {
+    Serve(host_, Operation::JoinCluster, {uuid, witnessNode, preferredFaultDomain, wait, flags},
+          [&] {
               if (clusterUuid == Uuid()) Refuse("Invalid cluster UUID: " + Quoted(uuid));
               host_.Modify([&](StateStore& store) {
                   EnterCluster(store, uuid, witnessNode, preferredFaultDomain);
@@ -123,7 +122,7 @@ void SimInfo::JoinCluster(const Uuid& clusterUuid, bool witnessNode,
 }
 
 void SimInfo::CreateCluster(const std::string& clusterUuid, bool join, bool wait) {
-    Serve(host_, Operation::CreateCluster, Json::array({clusterUuid, join, wait}), [&] {
+    Serve(host_, Operation::CreateCluster, {clusterUuid, join, wait}, [&] {
         if (!IsUuidText(clusterUuid) || clusterUuid == "00000000-0000-0000-0000-000000000000") {
             Refuse("Invalid cluster UUID: " + Quoted(clusterUuid));
         }
@@ -133,7 +132,7 @@ void SimInfo::CreateCluster(const std::string& clusterUuid, bool join, bool wait
 }
 
 void SimInfo::LeaveCluster(bool force) {
-    Serve(host_, Operation::LeaveCluster, Json::array({force}), [&] {
+    Serve(host_, Operation::LeaveCluster, {force}, [&] {
         host_.Modify([&](StateStore& store) {
             Json cluster = store.ReadSection("cluster");
             if (!cluster["enabled"].get<bool>()) Refuse("The host is not in a Mesk cluster");
@@ -153,11 +152,11 @@ void SimInfo::LeaveCluster(bool force) {
 
 void SimInfo::RestoreClusterConfig(bool boot) {
     // The state is the persisted configuration; there is nothing to re-apply.
-    Serve(host_, Operation::RestoreClusterConfig, Json::array({boot}), [] {});
+    Serve(host_, Operation::RestoreClusterConfig, {boot}, [] {});
 }
 
 void SimInfo::SetPreferredFaultDomain(const std::string& name) {
-    Serve(host_, Operation::SetPreferredFaultDomain, Json::array({name}), [&] {
+    Serve(host_, Operation::SetPreferredFaultDomain, {name}, [&] {
         host_.Modify([&](StateStore& store) {
             Json cluster = store.ReadSection("cluster");
             if (!cluster["enabled"].get<bool>() || !cluster["stretched"].get<bool>() ||
@@ -182,7 +181,7 @@ static std::string Endpoint(const std::string& ip, int port) {
 }
 
 void SimInfo::GetUnicastWitnesses(std::vector<std::string>& witnesses) {
-    Serve(host_, Operation::GetUnicastWitnesses, Json::array(), [&] {
+    Serve(host_, Operation::GetUnicastWitnesses, {}, [&] {
         witnesses.clear();
         for (const Json& entry : Store().ReadSection("unicastAgents")) {
             Agent agent;
@@ -199,8 +198,7 @@ void SimInfo::AddUnicastAgent(const std::string& nodeUuid, bool isWitness, bool 
     std::string ip = address.GetStringAddress();
     Serve(
         host_, Operation::AddUnicastAgent,
-        Json::array({nodeUuid, isWitness, supportsUnicast, ip, port, hasInterface, interfaceName}),
-        [&] {
+        {nodeUuid, isWitness, supportsUnicast, ip, port, hasInterface, interfaceName}, [&] {
             if (!IsUuidText(nodeUuid)) Refuse("Invalid node UUID: " + Quoted(nodeUuid));
             if (ip.empty()) Refuse("Invalid IP address: ''");
             CheckPort("port", port);
@@ -223,11 +221,11 @@ void SimInfo::AddUnicastAgent(const std::string& nodeUuid, bool isWitness, bool 
 }
 
 void SimInfo::RefreshUnicastAgents() {
-    Serve(host_, Operation::RefreshUnicastAgents, Json::array(), [] {});
+    Serve(host_, Operation::RefreshUnicastAgents, {}, [] {});
 }
 
 void SimInfo::GetUnicastAgents(std::vector<std::string>& agents) {
-    Serve(host_, Operation::GetUnicastAgents, Json::array(), [&] {
+    Serve(host_, Operation::GetUnicastAgents, {}, [&] {
         agents.clear();
         for (const Json& entry : Store().ReadSection("unicastAgents")) {
             agents.push_back(entry);
@@ -238,7 +236,7 @@ void SimInfo::GetUnicastAgents(std::vector<std::string>& agents) {
 bool SimInfo::RemoveUnicastAgent(const std::string& nodeUuid, const MeskIpAddress& address,
                                  int32_t port) {
     std::string ip = address.GetStringAddress();
-    return Serve(host_, Operation::RemoveUnicastAgent, Json::array({nodeUuid, ip, port}), [&] {
+    return Serve(host_, Operation::RemoveUnicastAgent, {nodeUuid, ip, port}, [&] {
         bool witness = false;
         host_.Modify([&](StateStore& store) {
             Json agents = store.ReadSection("unicastAgents");
@@ -263,7 +261,7 @@ void SimHost::GetInfoFromKOVRA(std::vector<MeskMemberInfo>& members, std::string
                                uint64_t& membershipEntryRevision, std::string& membershipUuid,
                                std::string& masterUuid, std::string& backupUuid,
                                std::string& maintenanceModeState) {
-    Serve(*this, Operation::GetInfoFromKOVRA, Json::array(), [&] {
+    Serve(*this, Operation::GetInfoFromKOVRA, {}, [&] {
         Json m = Store().ReadSection("membership");
         members.clear();
         for (const Json& member : m["members"]) {
@@ -281,19 +279,19 @@ void SimHost::GetInfoFromKOVRA(std::vector<MeskMemberInfo>& members, std::string
 }
 
 void SimHost::GetUnicastMode(bool& unicast) {
-    Serve(*this, Operation::GetUnicastMode, Json::array(),
+    Serve(*this, Operation::GetUnicastMode, {},
           [&] { unicast = Store().ReadSection("cluster")["unicastMode"]; });
 }
 
 bool SimHost::IsInStretchedCluster() {
-    return Serve(*this, Operation::IsInStretchedCluster, Json::array(), [&] {
+    return Serve(*this, Operation::IsInStretchedCluster, {}, [&] {
         Json cluster = Store().ReadSection("cluster");
         return cluster["enabled"].get<bool>() && cluster["stretched"].get<bool>();
     });
 }
 
 void SimHost::GetPreferredFaultDomainInfo(std::string& id, std::string& name) {
-    Serve(*this, Operation::GetPreferredFaultDomainInfo, Json::array(), [&] {
+    Serve(*this, Operation::GetPreferredFaultDomainInfo, {}, [&] {
         Json cluster = Store().ReadSection("cluster");
         if (!cluster["enabled"].get<bool>() || !cluster["stretched"].get<bool>()) {
             Refuse("The host is not in a stretched cluster");
@@ -304,7 +302,7 @@ void SimHost::GetPreferredFaultDomainInfo(std::string& id, std::string& name) {
 }
 
 bool SimHost::IsWitnessNode() {
-    return Serve(*this, Operation::IsWitnessNode, Json::array(),
+    return Serve(*this, Operation::IsWitnessNode, {},
                  [&] { return Store().ReadSection("cluster")["witness"].get<bool>(); });
 }
 

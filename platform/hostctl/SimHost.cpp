@@ -18,7 +18,7 @@ class SimPlugin : public HostCtl::MeskPlugin {
   public:
     explicit SimPlugin(SimHost& host) : host_(host) {}
     std::unique_ptr<HostCtl::Mesk::MeskInfo> GetMeskInfo() override {
-        return Serve(host_, Operation::GetMeskInfo, Json::array(),
+        return Serve(host_, Operation::GetMeskInfo, {},
                      [&] { return std::unique_ptr<HostCtl::Mesk::MeskInfo>(new SimInfo(host_)); });
     }
 
@@ -109,9 +109,9 @@ StateStore& SimHost::Store() {
     return *store_;
 }
 
-void SimHost::Enter(Operation op, Json args) {
+void SimHost::Enter(Operation op, CallArgs args) {
     Store();
-    log_.Record(op, std::move(args));
+    log_.Record(op, args);
     int64_t count = ++callCounts_[static_cast<size_t>(op)];
     for (const Fault& fault : faults_) {
         if (fault.op == OperationName(op) && (fault.call == 0 || fault.call == count)) {
@@ -125,38 +125,38 @@ void SimHost::NoteError(const std::string& message) {
 }
 
 std::unique_ptr<HostCtl::MeskPlugin> SimHost::GetMeskPlugin() {
-    return Serve(*this, Operation::GetMeskPlugin, Json::array(),
+    return Serve(*this, Operation::GetMeskPlugin, {},
                  [&] { return std::unique_ptr<HostCtl::MeskPlugin>(new SimPlugin(*this)); });
 }
 
 std::string SimHost::GetFormattedSystemDateTime() {
-    return Serve(*this, Operation::GetFormattedSystemDateTime, Json::array(),
+    return Serve(*this, Operation::GetFormattedSystemDateTime, {},
                  [&] { return HostBackend::GetFormattedSystemDateTime(); });
 }
 
 Uuid SimHost::StringToMeskUuid(const std::string& text) {
-    return Serve(*this, Operation::StringToMeskUuid, Json::array({text}),
+    return Serve(*this, Operation::StringToMeskUuid, {text},
                  [&] { return HostBackend::StringToMeskUuid(text); });
 }
 
 std::string SimHost::MeskUuidToString(const Uuid& uuid) {
     std::string text = HostBackend::MeskUuidToString(uuid);
-    return Serve(*this, Operation::MeskUuidToString, Json::array({text}), [&] { return text; });
+    return Serve(*this, Operation::MeskUuidToString, {text}, [&] { return text; });
 }
 
 size_t SimHost::UTF8StringCharLength(const std::string& text) {
-    return Serve(*this, Operation::UTF8StringCharLength, Json::array({text}),
+    return Serve(*this, Operation::UTF8StringCharLength, {text},
                  [&] { return HostBackend::UTF8StringCharLength(text); });
 }
 
 char* SimHost::UUID_CreateRandom() {
-    return Serve(*this, Operation::UUID_CreateRandom, Json::array(),
+    return Serve(*this, Operation::UUID_CreateRandom, {},
                  [&] { return HostBackend::UUID_CreateRandom(); });
 }
 
 char* SimHost::UUID_PackText(const char* text, char* buffer, size_t length) {
     Json shown = text != nullptr ? Json(std::string(text, length)) : Json(nullptr);
-    return Serve(*this, Operation::UUID_PackText, Json::array({shown, length}),
+    return Serve(*this, Operation::UUID_PackText, {shown, length},
                  [&] { return HostBackend::UUID_PackText(text, buffer, length); });
 }
 

@@ -55,7 +55,7 @@ class SimHost : public HostBackend {
     char* UUID_PackText(const char* text, char* buffer, size_t length) override;
 
     // Records the call of `op`, then throws the failure injected for it, if any.
-    void Enter(Operation op, Json args);
+    void Enter(Operation op, CallArgs args);
     // Notes on the call being served that it threw.
     void NoteError(const std::string& message);
     // Runs `change` in one transaction.
@@ -86,9 +86,9 @@ class SimHost : public HostBackend {
 // Runs `body` as the operation `op` of `host`: recorded, subject to injected failures, and
 // noted in the log when it throws.
 template <class Body>
-auto Serve(SimHost& host, Operation op, Json args, Body&& body) -> decltype(body()) {
+auto Serve(SimHost& host, Operation op, CallArgs args, Body&& body) -> decltype(body()) {
     try {
-        host.Enter(op, std::move(args));
+        host.Enter(op, args);
         return body();
     } catch (const std::exception& error) {
         host.NoteError(error.what());

@@ -41,7 +41,7 @@ void CheckGroup(const char* what, const MeskIpAddress& address, bool ipv6) {
 }  // namespace
 
 bool SimInfo::IsZuvNicInUse(const std::string& interfaceName, const std::string& trafficType) {
-    return Serve(host_, Operation::IsZuvNicInUse, Json::array({interfaceName, trafficType}), [&] {
+    return Serve(host_, Operation::IsZuvNicInUse, {interfaceName, trafficType}, [&] {
         std::string flag = TrafficFlag(trafficType);
         Json interfaces = Store().ReadSection("network")["interfaces"];
         auto it = FindInterface(interfaces, interfaceName);
@@ -51,39 +51,38 @@ bool SimInfo::IsZuvNicInUse(const std::string& interfaceName, const std::string&
 
 bool SimInfo::RemoveZuvNic(const std::string& interfaceName, bool force,
                            const std::string& trafficType) {
-    return Serve(
-        host_, Operation::RemoveZuvNic, Json::array({interfaceName, force, trafficType}), [&] {
-            std::string flag = TrafficFlag(trafficType);
-            bool removed = false;
-            host_.Modify([&](StateStore& store) {
-                Json network = store.ReadSection("network");
-                Json& interfaces = network["interfaces"];
-                auto it = FindInterface(interfaces, interfaceName);
-                if (it == interfaces.end()) {
-                    // An interface never configured is refused; with force the service is told
-                    // anyway. One that this invocation already took out (its other traffic
-                    // type went first) has nothing left to remove.
-                    if (force || host_.RemovedInThisInvocation(interfaceName)) return;
-                    Refuse("The interface " + Quoted(interfaceName) + " is not configured");
-                }
-                // An interface that does not carry this traffic type has nothing to remove.
-                if (!(*it)[flag].get<bool>()) return;
-                (*it)[flag] = false;
-                if (!(*it)["meskTraffic"].get<bool>() && !(*it)["witnessTraffic"].get<bool>()) {
-                    interfaces.erase(it);
-                    host_.NoteRemoved(interfaceName);
-                }
-                network["persisted"] = interfaces;
-                store.WriteSection("network", network);
-                removed = true;
-            });
-            return removed;
+    return Serve(host_, Operation::RemoveZuvNic, {interfaceName, force, trafficType}, [&] {
+        std::string flag = TrafficFlag(trafficType);
+        bool removed = false;
+        host_.Modify([&](StateStore& store) {
+            Json network = store.ReadSection("network");
+            Json& interfaces = network["interfaces"];
+            auto it = FindInterface(interfaces, interfaceName);
+            if (it == interfaces.end()) {
+                // An interface never configured is refused; with force the service is told
+                // anyway. One that this invocation already took out (its other traffic
+                // type went first) has nothing left to remove.
+                if (force || host_.RemovedInThisInvocation(interfaceName)) return;
+                Refuse("The interface " + Quoted(interfaceName) + " is not configured");
+            }
+            // An interface that does not carry this traffic type has nothing to remove.
+            if (!(*it)[flag].get<bool>()) return;
+            (*it)[flag] = false;
+            if (!(*it)["meskTraffic"].get<bool>() && !(*it)["witnessTraffic"].get<bool>()) {
+                interfaces.erase(it);
+                host_.NoteRemoved(interfaceName);
+            }
+            network["persisted"] = interfaces;
+            store.WriteSection("network", network);
+            removed = true;
         });
+        return removed;
+    });
 }
 
 void SimInfo::ClearNetworkConfig() {
     // The persisted copy stays, for RestoreNetworkConfig.
-    Serve(host_, Operation::ClearNetworkConfig, Json::array(), [&] {
+    Serve(host_, Operation::ClearNetworkConfig, {}, [&] {
         host_.Modify([&](StateStore& store) {
             Json network = store.ReadSection("network");
             network["interfaces"] = Json::array();
@@ -93,7 +92,7 @@ void SimInfo::ClearNetworkConfig() {
 }
 
 void SimInfo::RestoreNetworkConfig() {
-    Serve(host_, Operation::RestoreNetworkConfig, Json::array(), [&] {
+    Serve(host_, Operation::RestoreNetworkConfig, {}, [&] {
         host_.Modify([&](StateStore& store) {
             Json network = store.ReadSection("network");
             network["interfaces"] = network["persisted"];
@@ -103,7 +102,7 @@ void SimInfo::RestoreNetworkConfig() {
 }
 
 std::vector<std::unique_ptr<MeskZuvNicConfig2>> SimInfo::GetZuvNicConfigs() {
-    return Serve(host_, Operation::GetZuvNicConfigs, Json::array(), [&] {
+    return Serve(host_, Operation::GetZuvNicConfigs, {}, [&] {
         std::vector<std::unique_ptr<MeskZuvNicConfig2>> records;
         Json network = Store().ReadSection("network");
         for (const Json& n : network["interfaces"]) {
@@ -128,7 +127,7 @@ bool SimInfo::SetZuvNicConfig(const MeskZuvNicConfig2& config) {
     n["meskTraffic"] = config.meskTraffic;
     n["witnessTraffic"] = config.witnessTraffic;
     n["options"] = config.GetOptions();
-    return Serve(host_, Operation::SetZuvNicConfig, Json::array({n}), [&] {
+    return Serve(host_, Operation::SetZuvNicConfig, {n}, [&] {
         if (config.GetZuvnicName().empty()) Refuse("The interface name cannot be empty");
         CheckGroup("agent multicast group", config.GetAgentMulticastGroup(), false);
         CheckGroup("agent IPv6 multicast group", config.GetAgentV6MulticastGroup(), true);

@@ -136,7 +136,7 @@ void Tag(SimHost& host, const std::string& name, bool tagged) {
 }  // namespace
 
 void SimInfo::GetMeskDiskUuids(std::vector<Uuid>& uuids) {
-    Serve(host_, Operation::GetMeskDiskUuids, Json::array(), [&] {
+    Serve(host_, Operation::GetMeskDiskUuids, {}, [&] {
         uuids.clear();
         for (const Disk& disk : Store().Disks()) {
             if (IsGrouped(disk)) uuids.push_back(host_.HostBackend::StringToMeskUuid(disk.uuid));
@@ -147,7 +147,7 @@ void SimInfo::GetMeskDiskUuids(std::vector<Uuid>& uuids) {
 void SimInfo::GetDiskInfo(const Uuid& uuid, const std::vector<std::shared_ptr<MeskDiskLun>>& luns,
                           MeskDiskInfo& info) {
     std::string text = host_.HostBackend::MeskUuidToString(uuid);
-    Serve(host_, Operation::GetDiskInfo, Json::array({text, luns.size()}), [&] {
+    Serve(host_, Operation::GetDiskInfo, {text, luns.size()}, [&] {
         const Disk* disk = Store().FindDisk(text);
         if (disk == nullptr) Refuse("No Mesk disk with UUID " + text);
         info.name = disk->name;
@@ -171,7 +171,7 @@ void SimInfo::GetDiskInfo(const Uuid& uuid, const std::vector<std::shared_ptr<Me
 }
 
 void SimInfo::AddDisks(const std::string& ssd, const std::vector<std::string>& disks) {
-    Serve(host_, Operation::AddDisks, Json::array({ssd, disks}), [&] {
+    Serve(host_, Operation::AddDisks, {ssd, disks}, [&] {
         host_.Modify([&](StateStore& store) {
             Disk cache = DeviceNamed(store, ssd);
             if (!cache.isSsd) Refuse("Disk " + Quoted(ssd) + " is not an SSD");
@@ -211,21 +211,21 @@ void SimInfo::AddDisks(const std::string& ssd, const std::vector<std::string>& d
 }
 
 void SimInfo::RemoveDisk(const std::string& disk, const std::string& evacuationMode) {
-    Serve(host_, Operation::RemoveDisk, Json::array({disk, evacuationMode}), [&] {
+    Serve(host_, Operation::RemoveDisk, {disk, evacuationMode}, [&] {
         CheckEvacuationMode(evacuationMode);
         host_.Modify([&](StateStore& store) { ReleaseDisk(store, GroupedDisk(store, disk)); });
     });
 }
 
 void SimInfo::RemoveDiskGroup(const std::string& ssd, const std::string& evacuationMode) {
-    Serve(host_, Operation::RemoveDiskGroup, Json::array({ssd, evacuationMode}), [&] {
+    Serve(host_, Operation::RemoveDiskGroup, {ssd, evacuationMode}, [&] {
         CheckEvacuationMode(evacuationMode);
         host_.Modify([&](StateStore& store) { ReleaseGroup(store, FrontingSsd(store, ssd)); });
     });
 }
 
 void SimInfo::RemoveDiskByUuid(const std::string& uuid, const std::string& evacuationMode) {
-    Serve(host_, Operation::RemoveDiskByUuid, Json::array({uuid, evacuationMode}), [&] {
+    Serve(host_, Operation::RemoveDiskByUuid, {uuid, evacuationMode}, [&] {
         CheckEvacuationMode(evacuationMode);
         host_.Modify([&](StateStore& store) {
             Disk disk = DiskWithUuid(store, uuid);
@@ -240,14 +240,14 @@ void SimInfo::RemoveDiskByUuid(const std::string& uuid, const std::string& evacu
 }
 
 void SimInfo::MountDiskGroup(const std::string& ssd, bool flag) {
-    Serve(host_, Operation::MountDiskGroup, Json::array({ssd, flag}), [&] {
+    Serve(host_, Operation::MountDiskGroup, {ssd, flag}, [&] {
         host_.Modify(
             [&](StateStore& store) { SetGroupMounted(store, FrontingSsd(store, ssd), true); });
     });
 }
 
 void SimInfo::MountByUuid(const std::string& uuid) {
-    Serve(host_, Operation::MountByUuid, Json::array({uuid}), [&] {
+    Serve(host_, Operation::MountByUuid, {uuid}, [&] {
         host_.Modify([&](StateStore& store) {
             Disk disk = DiskWithUuid(store, uuid);
             if (!IsGrouped(disk)) Refuse("Disk " + uuid + " is not in use by Mesk");
@@ -261,47 +261,45 @@ void SimInfo::MountByUuid(const std::string& uuid) {
 }
 
 void SimInfo::MountDisk(const std::string& disk) {
-    Serve(host_, Operation::MountDisk, Json::array({disk}), [&] {
+    Serve(host_, Operation::MountDisk, {disk}, [&] {
         host_.Modify([&](StateStore& store) { SetMounted(store, GroupedDisk(store, disk), true); });
     });
 }
 
 void SimInfo::UnmountDiskGroup(const std::string& ssd, bool flag) {
-    Serve(host_, Operation::UnmountDiskGroup, Json::array({ssd, flag}), [&] {
+    Serve(host_, Operation::UnmountDiskGroup, {ssd, flag}, [&] {
         host_.Modify(
             [&](StateStore& store) { SetGroupMounted(store, FrontingSsd(store, ssd), false); });
     });
 }
 
 void SimInfo::UnmountDisk(const std::string& disk, bool flag) {
-    Serve(host_, Operation::UnmountDisk, Json::array({disk, flag}), [&] {
+    Serve(host_, Operation::UnmountDisk, {disk, flag}, [&] {
         host_.Modify(
             [&](StateStore& store) { SetMounted(store, GroupedDisk(store, disk), false); });
     });
 }
 
 void SimInfo::AddCapacityFlashTag(const std::string& disk) {
-    Serve(host_, Operation::AddCapacityFlashTag, Json::array({disk}),
-          [&] { Tag(host_, disk, true); });
+    Serve(host_, Operation::AddCapacityFlashTag, {disk}, [&] { Tag(host_, disk, true); });
 }
 
 void SimInfo::RemoveCapacityFlashTag(const std::string& disk) {
-    Serve(host_, Operation::RemoveCapacityFlashTag, Json::array({disk}),
-          [&] { Tag(host_, disk, false); });
+    Serve(host_, Operation::RemoveCapacityFlashTag, {disk}, [&] { Tag(host_, disk, false); });
 }
 
 bool SimInfo::GetAutoClaimMode() {
-    return Serve(host_, Operation::GetAutoClaimMode, Json::array(),
+    return Serve(host_, Operation::GetAutoClaimMode, {},
                  [&] { return Store().ReadSection("storage")["autoClaimMode"].get<bool>(); });
 }
 
 void SimInfo::SetAutoClaimMode(bool enabled) {
-    Serve(host_, Operation::SetAutoClaimMode, Json::array({enabled}),
+    Serve(host_, Operation::SetAutoClaimMode, {enabled},
           [&] { SetValue("storage", "autoClaimMode", enabled); });
 }
 
 void SimHost::GetMeskDisks(std::vector<std::shared_ptr<MeskDiskLun>>& luns) {
-    Serve(*this, Operation::GetMeskDisks, Json::array(), [&] {
+    Serve(*this, Operation::GetMeskDisks, {}, [&] {
         for (const Disk& disk : Store().Disks()) {
             if (!disk.lun) continue;
             luns.push_back(
