@@ -1,16 +1,20 @@
 // The host-control library's own value types and the static entry points, which forward to
 // the current backend.
 #include <arpa/inet.h>
-#include <uuid/uuid.h>
+#include <sys/random.h>
 
+#include <array>
 #include <cctype>
+#include <cerrno>
 #include <cstdarg>
 #include <cstdio>
 #include <cstdlib>
+#include <cstring>
 #include <ctime>
 
 #include "HostBackend.h"
 #include "SimHost.h"
+#include "SimInfo.h"
 #include "hostctl/HostUuid.h"
 #include "hostctl/MeskCtlException.h"
 #include "hostctl/MeskInfo.h"
@@ -189,44 +193,54 @@ const PolicyClassName kPolicyClasses[] = {
     {HostCtl::Mesk::MESK_POLICY_CLASS_VMEM, "vmem"},
 };
 
-int HexValue(char c) {
-    if (c >= '0' && c <= '9') return c - '0';
-    if (c >= 'a' && c <= 'f') return c - 'a' + 10;
-    if (c >= 'A' && c <= 'F') return c - 'A' + 10;
-    return -1;
-}
+// The value of each hexadecimal digit, 16 for any other character.
+constexpr auto kHexValues = [] {
+    std::array<uint8_t, 256> values{};
+    for (auto& value : values) value = 16;
+    for (int c = 0; c < 10; ++c) values[size_t('0' + c)] = uint8_t(c);
+    for (int c = 0; c < 6; ++c) values[size_t('a' + c)] = values[size_t('A' + c)] = uint8_t(10 + c);
+    return values;
+}();
 
-bool IsDashPosition(size_t i) {
-    return i == 8 || i == 13 || i == 18 || i == 23;
-}
+// Where each byte's two digits start in the 36-character text form.
+constexpr size_t kDigitPositions[16] = {0, 2, 4, 6, 9, 11, 14, 16, 19, 21, 24, 26, 28, 30, 32, 34};
 
 // Parses the 36-character UUID text form; false for anything else.
 bool ParseUuid(const char* text, size_t length, Uuid& uuid) {
-    if (length != 36) return false;
-    size_t byte = 0;
-    for (size_t i = 0; i < 36; ++i) {
-        if (IsDashPosition(i)) {
-            if (text[i] != '-') return false;
-            continue;
-        }
-        int high = HexValue(text[i]);
-        int low = i + 1 < 36 ? HexValue(text[i + 1]) : -1;
-        if (high < 0 || low < 0) return false;
-        uuid.bytes[byte++] = static_cast<uint8_t>(high << 4 | low);
-        ++i;
+    if (length != 36 || text[8] != '-' || text[13] != '-' || text[18] != '-' || text[23] != '-') {
+        return false;
     }
-    return true;
+    unsigned invalid = 0;
+    for (size_t byte = 0; byte < 16; ++byte) {
+        unsigned high = kHexValues[static_cast<unsigned char>(text[kDigitPositions[byte]])];
+        unsigned low = kHexValues[static_cast<unsigned char>(text[kDigitPositions[byte] + 1])];
+        invalid |= high | low;
+        uuid.bytes[byte] = static_cast<uint8_t>(high << 4 | low);
+    }
+    return invalid < 16;
 }
 
 void FormatUuid(const Uuid& uuid, char* out) {
     static const char kDigits[] = "0123456789abcdef";
-    size_t pos = 0;
+    std::memcpy(out, "xxxxxxxx-xxxx-xxxx-xxxx-xxxxxxxxxxxx", 37);
     for (size_t byte = 0; byte < 16; ++byte) {
-        if (byte == 4 || byte == 6 || byte == 8 || byte == 10) out[pos++] = '-';
-        out[pos++] = kDigits[uuid.bytes[byte] >> 4];
-        out[pos++] = kDigits[uuid.bytes[byte] & 0xf];
+        out[kDigitPositions[byte]] = kDigits[uuid.bytes[byte] >> 4];
+        out[kDigitPositions[byte] + 1] = kDigits[uuid.bytes[byte] & 0xf];
     }
-    out[pos] = '\0';
+}
+
+// A random (version 4) UUID, from the kernel's random source.
+bool RandomUuid(Uuid& uuid) {
+    size_t got = 0;
+    while (got < sizeof uuid.bytes) {
+        ssize_t read = getrandom(uuid.bytes + got, sizeof uuid.bytes - got, 0);
+        if (read < 0 && errno == EINTR) continue;
+        if (read <= 0) return false;
+        got += static_cast<size_t>(read);
+    }
+    uuid.bytes[6] = static_cast<uint8_t>((uuid.bytes[6] & 0x0f) | 0x40);
+    uuid.bytes[8] = static_cast<uint8_t>((uuid.bytes[8] & 0x3f) | 0x80);
+    return true;
 }
 
 HostBackend* installed = nullptr;
@@ -289,10 +303,10 @@ std::vector<MeskPolicyClass> HostBackend::GetMeskPolicyClasses() {
 }
 
 char* HostBackend::UUID_CreateRandom() {
-    uuid_t uuid;
-    uuid_generate_random(uuid);
+    Uuid uuid;
+    if (!RandomUuid(uuid)) return nullptr;
     char* text = static_cast<char*>(std::malloc(37));
-    if (text != nullptr) uuid_unparse_lower(uuid, text);
+    if (text != nullptr) FormatUuid(uuid, text);
     return text;
 }
 
@@ -301,6 +315,16 @@ char* HostBackend::UUID_PackText(const char* text, char* buffer, size_t length) 
     if (text == nullptr || buffer == nullptr || !ParseUuid(text, length, uuid)) return nullptr;
     FormatUuid(uuid, buffer);
     return buffer;
+}
+
+std::string NewUuid() {
+    Uuid uuid;
+    if (!RandomUuid(uuid)) {
+        throw MeskCtlException(std::string("Cannot make a random UUID: ") + std::strerror(errno));
+    }
+    char text[37];
+    FormatUuid(uuid, text);
+    return text;
 }
 
 HostBackend& CurrentBackend() {

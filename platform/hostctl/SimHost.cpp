@@ -1,7 +1,5 @@
 #include "SimHost.h"
 
-#include <uuid/uuid.h>
-
 #include <cstdlib>
 #include <ctime>
 
@@ -45,14 +43,6 @@ int64_t NowNanoseconds() {
     timespec now{};
     clock_gettime(CLOCK_REALTIME, &now);
     return int64_t(now.tv_sec) * 1000000000 + now.tv_nsec;
-}
-
-std::string NewUuid() {
-    uuid_t uuid;
-    uuid_generate_random(uuid);
-    char text[37];
-    uuid_unparse_lower(uuid, text);
-    return text;
 }
 
 std::string Quoted(const std::string& text) {

@@ -1,4 +1,5 @@
 // The host-control library's value types and conversions, which every command relies on.
+#include <cstdlib>
 #include <cstring>
 
 #include "SimFixture.h"
@@ -64,6 +65,8 @@ TEST_F(ValueTypes, UuidTextConvertsBothWaysAndPacks) {
         {"52f1c2a0-7b3e-4d01-9a6e-00a1b2c3d4e5f", nullptr},
         {"52f1c2a07b3e-4d01-9a6e-00a1b2c3d4e5-", nullptr},
         {"52f1c2a0-7b3e-4d01-9a6e-00a1b2c3d4eg", nullptr},
+        {"52f1c2a0-7b3e-4d01-9a6e-00a1b2c3d4:@", nullptr},
+        {"`2f1c2a0-7b3e-4d01-9a6e-00a1b2c3d4e5", nullptr},
         {"", nullptr},
     };
     for (const Case& c : cases) {
@@ -81,6 +84,13 @@ TEST_F(ValueTypes, UuidTextConvertsBothWaysAndPacks) {
     }
     HostCtl::Mesk::Uuid uuid = MeskUtil::StringToMeskUuid("01020304-0506-0708-090a-0b0c0d0e0f10");
     for (int i = 0; i < 16; ++i) EXPECT_EQ(uuid.bytes[i], i + 1);
+    // Random ones: version 4, the RFC variant, in the canonical form.
+    char* random = UUID_CreateRandom();
+    ASSERT_NE(random, nullptr);
+    EXPECT_EQ(MeskUtil::MeskUuidToString(MeskUtil::StringToMeskUuid(random)), random);
+    EXPECT_EQ(random[14], '4');
+    EXPECT_NE(std::strchr("89ab", random[19]), nullptr);
+    std::free(random);
 }
 
 }  // namespace
