@@ -124,6 +124,7 @@ class StateStore {
     std::map<const char*, sqlite3_stmt*> statements_;
 
     // What the current transaction has read.
+    bool noFaults_ = false;  // known to have no injected failure
     std::map<std::string, Json> sections_;
     bool disksLoaded_ = false;
     std::vector<Disk> disks_;
