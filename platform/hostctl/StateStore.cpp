@@ -143,8 +143,8 @@ void StateStore::Forget() {
     sections_.clear();
     disksLoaded_ = false;
     disks_.clear();
-    byUuid_.clear();
-    byDevice_.clear();
+    byUuid_.Clear();
+    byDevice_.Clear();
 }
 
 void StateStore::BeginRead() {
@@ -237,15 +237,8 @@ void StateStore::LoadDisks() {
             disk, [&](const char*, auto& member, DiskCheck) { Read(query, column++, member); });
     }
     if (step != SQLITE_DONE) Fail("cannot read the disks");
-    // The disks are in place now: the keys stay valid until they are read again.
-    byUuid_.clear();
-    byDevice_.clear();
-    byUuid_.reserve(disks_.size());
-    byDevice_.reserve(disks_.size());
-    for (size_t i = 0; i < disks_.size(); ++i) {
-        byUuid_.emplace(disks_[i].uuid, i);
-        if (disks_[i].lun) byDevice_.emplace(disks_[i].name, i);
-    }
+    byUuid_.Build(disks_);
+    byDevice_.Build(disks_, &Disk::lun);
     disksLoaded_ = true;
 }
 
@@ -256,18 +249,38 @@ const std::vector<Disk>& StateStore::Disks() {
 
 const Disk* StateStore::FindDisk(const std::string& uuid) {
     LoadDisks();
-    return Find(byUuid_, uuid);
+    return byUuid_.Find(disks_, uuid);
 }
 
 const Disk* StateStore::FindDevice(const std::string& name) {
     LoadDisks();
-    return Find(byDevice_, name);
+    return byDevice_.Find(disks_, name);
 }
 
-const Disk* StateStore::Find(const std::unordered_map<std::string_view, size_t>& index,
-                             const std::string& key) const {
-    auto it = index.find(key);
-    return it == index.end() ? nullptr : &disks_[it->second];
+void StateStore::DiskIndex::Build(const std::vector<Disk>& disks, bool Disk::*onlyWith) {
+    size_t size = 16;
+    while (size < 2 * disks.size()) size *= 2;
+    slots_.assign(size, 0);
+    for (size_t i = 0; i < disks.size(); ++i) {
+        if (onlyWith != nullptr && !(disks[i].*onlyWith)) continue;
+        const std::string& key = disks[i].*key_;
+        size_t slot = std::hash<std::string_view>()(key) & (size - 1);
+        while (slots_[slot] != 0 && disks[slots_[slot] - 1].*key_ != key) {
+            slot = (slot + 1) & (size - 1);
+        }
+        if (slots_[slot] == 0) slots_[slot] = static_cast<uint32_t>(i + 1);
+    }
+}
+
+const Disk* StateStore::DiskIndex::Find(const std::vector<Disk>& disks,
+                                        std::string_view key) const {
+    if (slots_.empty()) return nullptr;
+    size_t slot = std::hash<std::string_view>()(key) & (slots_.size() - 1);
+    for (; slots_[slot] != 0; slot = (slot + 1) & (slots_.size() - 1)) {
+        const Disk& disk = disks[slots_[slot] - 1];
+        if (disk.*key_ == key) return &disk;
+    }
+    return nullptr;
 }
 
 void StateStore::WriteDisk(const Disk& disk) {
@@ -278,7 +291,7 @@ void StateStore::WriteDisk(const Disk& disk) {
     BindDisk(statement, 2, disk);
     if (sqlite3_step(statement) != SQLITE_DONE) Fail("cannot write a disk");
     // The cache follows, unless the disk moves in an index.
-    const Disk* cached = disksLoaded_ ? Find(byUuid_, disk.uuid) : nullptr;
+    const Disk* cached = disksLoaded_ ? byUuid_.Find(disks_, disk.uuid) : nullptr;
     if (cached != nullptr && cached->name == disk.name && cached->lun == disk.lun) {
         disks_[static_cast<size_t>(cached - disks_.data())] = disk;
     } else {

@@ -21,7 +21,6 @@
 #include <map>
 #include <string>
 #include <string_view>
-#include <unordered_map>
 #include <vector>
 
 #include "StateDocument.h"
@@ -108,8 +107,21 @@ class StateStore {
     void EndTransaction(const char* sql);
     void Forget();
     void LoadDisks();
-    const Disk* Find(const std::unordered_map<std::string_view, size_t>& index,
-                     const std::string& key) const;
+    // An index of disks_ by one text field: open addressing over their positions, so that
+    // indexing thousands of disks allocates once.
+    class DiskIndex {
+      public:
+        explicit DiskIndex(std::string Disk::*key) : key_(key) {}
+        void Clear() { slots_.clear(); }
+        // Indexes `disks` (only those with the flag `onlyWith` set, when given); of disks
+        // with equal keys, the first is found.
+        void Build(const std::vector<Disk>& disks, bool Disk::*onlyWith = nullptr);
+        const Disk* Find(const std::vector<Disk>& disks, std::string_view key) const;
+
+      private:
+        std::string Disk::*key_;
+        std::vector<uint32_t> slots_;  // a position plus one; 0 in an empty slot
+    };
     sqlite3_stmt* Statement(const char* sql);
     int64_t QueryNumber(const char* sql);  // the first column of the first row
     [[noreturn]] void RefuseChange();
@@ -128,10 +140,9 @@ class StateStore {
     std::map<std::string, Json> sections_;
     bool disksLoaded_ = false;
     std::vector<Disk> disks_;
-    // Indexes of disks_, by UUID and, of the disks with a device, by name; the keys are the
-    // disks' own texts.
-    std::unordered_map<std::string_view, size_t> byUuid_;
-    std::unordered_map<std::string_view, size_t> byDevice_;
+    // Indexes of disks_, by UUID and, of the disks with a device, by name.
+    DiskIndex byUuid_{&Disk::uuid};
+    DiskIndex byDevice_{&Disk::name};
 };
 
 }  // namespace HostCtlSim
