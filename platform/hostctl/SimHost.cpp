@@ -131,7 +131,8 @@ Uuid SimHost::StringToMeskUuid(const std::string& text) {
 
 std::string SimHost::MeskUuidToString(const Uuid& uuid) {
     std::string text = HostBackend::MeskUuidToString(uuid);
-    return Serve(*this, Operation::MeskUuidToString, {text}, [&] { return text; });
+    // Logged before it is handed over.
+    return Serve(*this, Operation::MeskUuidToString, {text}, [&] { return std::move(text); });
 }
 
 size_t SimHost::UTF8StringCharLength(const std::string& text) {
