@@ -35,7 +35,7 @@ class HOSTCTL_API HostBackend {
     HOSTCTL_UTIL_OPERATIONS(HOSTCTL_BACKEND_OPERATION_)
 
     // Working defaults: local time, UUID and policy class conversions, UTF-8 counting,
-    // random UUIDs through libuuid.
+    // random UUIDs from the kernel's random source.
     HOSTCTL_UTIL_CONVERSIONS(HOSTCTL_BACKEND_CONVERSION_)
     virtual char* UUID_CreateRandom();
     virtual char* UUID_PackText(const char* text, char* buffer, size_t length);
