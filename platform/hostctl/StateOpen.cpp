@@ -7,7 +7,7 @@
 
 #include <cerrno>
 #include <cstring>
-#include <iostream>
+#include <cstdio>
 #include <optional>
 #include <type_traits>
 
@@ -262,8 +262,10 @@ void StateStore::AddNewKeys() {
     if (added.empty()) return;
     std::string list;
     for (const std::string& key : added) list += (list.empty() ? "" : ", ") + key;
-    std::cerr << "Simulated host state " << path_
-              << " was written by an older build; added with their defaults: " << list << "\n";
+    std::fprintf(stderr,
+                 "Simulated host state %s was written by an older build; added with their "
+                 "defaults: %s\n",
+                 path_.c_str(), list.c_str());
 }
 
 // The host is made whole in a file of its own, then renamed into place, so that no process
