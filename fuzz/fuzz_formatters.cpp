@@ -345,9 +345,17 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
                                (static_cast<unsigned char>(text[i + 1]) & 0xE0) != 0x80);
                 }
                 break;
-            case ReadBack::kJson:
+            case ReadBack::kJson: {
                 FUZZ_CHECK(!nlohmann::json::parse(text, nullptr, false).is_discarded());
+                // Written straight out, it must be what the JSON library makes of the result.
+                const int indent = std::string(formatter.name) == "json-pretty" ? 2 : -1;
+                FUZZ_CHECK(
+                    text ==
+                    App::ToJson(root.get(), options.fieldsGiven ? &options.fields : nullptr)
+                            .dump(indent, ' ', false, nlohmann::json::error_handler_t::replace) +
+                        "\n");
                 break;
+            }
             case ReadBack::kXml:
                 FUZZ_CHECK(WellFormedXml(text));
                 break;

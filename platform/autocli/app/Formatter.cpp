@@ -1,6 +1,8 @@
 // What the formatters share: output parameters, value texts, and the formatters by name.
 #include "Formatter.h"
 
+#include <charconv>
+
 #include <nlohmann/json.hpp>
 
 #include "Text.h"
@@ -26,15 +28,6 @@ bool AfterPrefix(const std::string& key, const char* prefix, std::string& rest) 
     }
     rest = key.substr(length);
     return true;
-}
-
-bool HasField(const MetaStruct& structure, const std::string& name) {
-    for (const auto& field : structure.GetFields()) {
-        if (field.name == name) {
-            return true;
-        }
-    }
-    return false;
 }
 
 // A list of texts in a CSV cell: a JSON array, which any JSON parser splits back.
@@ -77,8 +70,9 @@ std::string OutputLayout::Title(const MetaStruct& structure) const {
         }
         title.append(pattern, pos, open - pos);
         const std::string name = pattern.substr(open + 1, close - open - 1);
-        if (HasField(structure, name)) {
-            title += ValueText(structure.GetField(name).get());
+        const size_t field = structure.FindField(name);
+        if (field < structure.FieldCount()) {
+            AppendValueText(title, structure.FieldAt(field).value.get());
             pos = close + 1;
             continue;
         }
@@ -103,8 +97,19 @@ bool OutputLayout::TitleNamesFields(const std::string& structName) const {
     return found != titles_.end() && found->second.find('%') != std::string::npos;
 }
 
-std::vector<const MetaStruct::Field*> OutputLayout::Fields(const MetaStruct& structure,
-                                                           bool topLevel) const {
+const OutputLayout::Selection& OutputLayout::Select(const MetaStruct& structure,
+                                                    bool topLevel) const {
+    Selection& selection = selections_[topLevel ? 1 : 0];
+    const MetaStruct*& model = selectedFor_[topLevel ? 1 : 0];
+    // The rows of a listing have the same fields: chosen once for all of them.
+    if (model != nullptr && model->GetName() == structure.GetName() &&
+        structure.HasFieldsOf(*model)) {
+        return selection;
+    }
+    model = &structure;
+    selection.fields.clear();
+    selection.units.clear();
+    selection.serial = ++serials_;
     const std::vector<std::string>* names = nullptr;
     if (topLevel && options_.fieldsGiven) {
         names = &options_.fields;
@@ -114,22 +119,22 @@ std::vector<const MetaStruct::Field*> OutputLayout::Fields(const MetaStruct& str
             names = &found->second;
         }
     }
-    std::vector<const MetaStruct::Field*> shown;
     if (names == nullptr) {
-        for (const auto& field : structure.GetFields()) {
-            shown.push_back(&field);
+        for (size_t i = 0; i < structure.FieldCount(); ++i) {
+            selection.fields.push_back(i);
         }
-        return shown;
-    }
-    for (const auto& name : *names) {
-        for (const auto& field : structure.GetFields()) {
-            if (field.name == name) {
-                shown.push_back(&field);
-                break;
+    } else {
+        for (const auto& name : *names) {
+            const size_t index = structure.FindField(name);
+            if (index < structure.FieldCount()) {
+                selection.fields.push_back(index);
             }
         }
     }
-    return shown;
+    for (size_t index : selection.fields) {
+        selection.units.push_back(Unit(structure.GetName(), structure.FieldAt(index).name));
+    }
+    return selection;
 }
 
 std::string OutputLayout::Unit(const std::string& structName, const std::string& field) const {
@@ -141,44 +146,56 @@ std::string OutputLayout::Unit(const std::string& structName, const std::string&
     return found == units_.end() ? std::string() : found->second;
 }
 
-std::string ValueText(const MetaObject* value, const std::string& unit) {
-    std::string text;
+void AppendValueText(std::string& out, const MetaObject* value) {
     if (value == nullptr) {
-        return text;
+        return;
     }
     switch (value->GetType()) {
         case MetaObj::META_STRING: {
             const auto& scalar = static_cast<const MetaObj::MetaString&>(*value);
-            text = scalar.HasValue() ? scalar.GetValue() : std::string();
-            break;
+            out += scalar.GetValue();
+            return;
         }
         case MetaObj::META_INT: {
             const auto& scalar = static_cast<const MetaObj::MetaInt&>(*value);
-            text = scalar.HasValue() ? std::to_string(scalar.GetValue()) : std::string();
-            break;
+            if (scalar.HasValue()) {
+                char digits[24];
+                const auto end = std::to_chars(digits, digits + sizeof digits, scalar.GetValue());
+                out.append(digits, end.ptr);
+            }
+            return;
         }
         case MetaObj::META_BOOL: {
             const auto& scalar = static_cast<const MetaObj::MetaBool&>(*value);
-            text = scalar.HasValue() ? (scalar.GetValue() ? "true" : "false") : "";
-            break;
+            if (scalar.HasValue()) {
+                out += scalar.GetValue() ? "true" : "false";
+            }
+            return;
         }
         case MetaObj::META_LIST: {
             const auto& list = static_cast<const MetaObj::MetaList&>(*value);
             if (list.GetElementType() != MetaObj::META_STRUCT) {
-                std::vector<std::string> items;
+                bool first = true;
                 for (const auto& element : list.GetElements()) {
-                    items.push_back(ValueText(element.get()));
+                    if (!first) {
+                        out += ", ";
+                    }
+                    first = false;
+                    AppendValueText(out, element.get());
                 }
-                text = Join(items, ", ");
-                break;
+                return;
             }
-            text = ToJson(value).dump(-1, ' ', false, nlohmann::json::error_handler_t::replace);
             break;
         }
         case MetaObj::META_STRUCT:
-            text = ToJson(value).dump(-1, ' ', false, nlohmann::json::error_handler_t::replace);
             break;
     }
+    out += ToJson(value).dump(-1, ' ', false, nlohmann::json::error_handler_t::replace);
+}
+
+std::string ValueText(const MetaObject* value, const std::string& unit) {
+    std::string text;
+    AppendValueText(text, value);
     if (!text.empty() && !unit.empty()) {
         text += " " + unit;
     }
@@ -240,17 +257,26 @@ bool BuildGrid(const MetaObject& root, const OutputLayout& layout, CellStyle sty
         return true;
     }
     grid.structName = model->GetName();
-    for (const auto* field : layout.Fields(*model, true)) {
-        grid.columns.push_back(field->name);
+    const OutputLayout::Selection& selection = layout.Select(*model, true);
+    for (size_t index : selection.fields) {
+        grid.columns.push_back(model->FieldAt(index).name);
     }
+    grid.rows.reserve(elements.size());
     for (const auto* element : elements) {
+        // Elements made like the first are read by position, the others by name.
+        const bool alike = element->GetName() == model->GetName() && element->HasFieldsOf(*model);
         std::vector<std::string> row;
-        for (const auto& column : grid.columns) {
-            const MetaObject* value = element->GetField(column).get();
-            row.push_back(
-                style == CellStyle::kScreen
-                    ? ScreenText(ValueText(value, layout.Unit(element->GetName(), column)))
-                    : MachineCell(value));
+        row.reserve(grid.columns.size());
+        for (size_t column = 0; column < grid.columns.size(); ++column) {
+            const MetaObject* value = alike ? element->FieldAt(selection.fields[column]).value.get()
+                                            : element->GetField(grid.columns[column]).get();
+            if (style == CellStyle::kMachine) {
+                row.push_back(MachineCell(value));
+                continue;
+            }
+            const std::string unit = alike ? selection.units[column]
+                                           : layout.Unit(element->GetName(), grid.columns[column]);
+            row.push_back(ScreenText(ValueText(value, unit)));
         }
         grid.rows.push_back(std::move(row));
     }

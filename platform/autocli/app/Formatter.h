@@ -26,6 +26,8 @@ struct FormatOptions {
 };
 
 // The command's "header:", "fields:" and "units:" parameters, looked up by structure name.
+// One layout serves the structures of one result, which must outlive it: it keeps what it
+// chose for the last structure and hands it out again for the next one with the same fields.
 class OutputLayout {
   public:
     explicit OutputLayout(const FormatOptions& options);
@@ -39,11 +41,20 @@ class OutputLayout {
     std::string RawTitle(const std::string& structName) const;
     // Whether the structure's title names one of its fields, so that it differs per element.
     bool TitleNamesFields(const std::string& structName) const;
-    // The fields to show, in display order: --fields for a top-level structure when given,
-    // else the "fields:" list, else every field in declared order. Names the structure does
-    // not have are left out.
-    std::vector<const MetaObj::MetaStruct::Field*> Fields(const MetaObj::MetaStruct& structure,
-                                                          bool topLevel) const;
+
+    // The fields of a structure to show.
+    struct Selection {
+        // Their positions in the structure, in display order: --fields for a top-level
+        // structure when given, else the "fields:" list, else every field in declared order.
+        // Names the structure does not have are left out.
+        std::vector<size_t> fields;
+        // The unit label of each, or empty.
+        std::vector<std::string> units;
+        // Changes whenever the selection is made anew, so that a formatter may keep what it
+        // derives from one.
+        unsigned serial = 0;
+    };
+    const Selection& Select(const MetaObj::MetaStruct& structure, bool topLevel) const;
     // The unit label of a field, or empty.
     std::string Unit(const std::string& structName, const std::string& field) const;
 
@@ -52,11 +63,17 @@ class OutputLayout {
     std::map<std::string, std::string> titles_;
     std::map<std::string, std::vector<std::string>> fields_;
     std::map<std::string, std::string> units_;  // key: "<StructName>.<Field>"
+    // The last selection for a top-level [1] and a nested [0] structure, and whose it was.
+    mutable Selection selections_[2];
+    mutable const MetaObj::MetaStruct* selectedFor_[2] = {nullptr, nullptr};
+    mutable unsigned serials_ = 0;
 };
 
 // The text of a scalar (empty when it has no value), of a list of texts joined by ", ", and
 // of anything else as compact JSON; followed by the unit, if any, when there is a value.
 std::string ValueText(const MetaObj::MetaObject* value, const std::string& unit = std::string());
+// ValueText(value) appended to `out`.
+void AppendValueText(std::string& out, const MetaObj::MetaObject* value);
 
 // A structure or a list of structures as rows of cells under named columns: a structure
 // is one row, a list one row per element. The columns are the fields shown of the first

@@ -1,4 +1,6 @@
 // The "json" and "json-pretty" formatters.
+#include <algorithm>
+
 #include <nlohmann/json.hpp>
 
 #include "Formatter.h"
@@ -67,22 +69,152 @@ nlohmann::ordered_json ToJson(const MetaObject* value, const std::vector<std::st
 
 namespace {
 
-// Texts from the host are not guaranteed to be UTF-8; a bad byte becomes U+FFFD instead of
-// an exception.
-std::string Dump(const MetaObject& root, const FormatOptions& options, int indent) {
-    return ToJson(&root, options.fieldsGiven ? &options.fields : nullptr)
-               .dump(indent, ' ', false, nlohmann::json::error_handler_t::replace) +
-           "\n";
+// Writes a result as JSON straight into the output, byte for byte as ToJson(...).dump() with
+// the same indentation would, without building the document first: a listing of thousands of
+// structures would otherwise make a JSON value for every field. Texts from the host are not
+// guaranteed to be UTF-8; a bad byte becomes U+FFFD instead of an exception.
+class JsonWriter {
+  public:
+    JsonWriter(std::string& out, bool pretty) : out_(out), pretty_(pretty) {}
+
+    // `fields`, when given, are the fields to write of a top-level structure.
+    void Value(const MetaObject* value, const std::vector<std::string>* fields, size_t depth) {
+        if (value == nullptr) {
+            out_ += "null";
+            return;
+        }
+        switch (value->GetType()) {
+            case MetaObj::META_STRING: {
+                const auto& scalar = static_cast<const MetaObj::MetaString&>(*value);
+                if (scalar.HasValue()) {
+                    String(scalar.GetValue());
+                } else {
+                    out_ += "null";
+                }
+                return;
+            }
+            case MetaObj::META_INT:
+            case MetaObj::META_BOOL: {
+                const size_t start = out_.size();
+                AppendValueText(out_, value);
+                if (out_.size() == start) {
+                    out_ += "null";
+                }
+                return;
+            }
+            case MetaObj::META_STRUCT:
+                Struct(static_cast<const MetaObj::MetaStruct&>(*value), fields, depth);
+                return;
+            case MetaObj::META_LIST:
+                List(static_cast<const MetaObj::MetaList&>(*value), fields, depth);
+                return;
+        }
+    }
+
+  private:
+    void Struct(const MetaObj::MetaStruct& structure, const std::vector<std::string>* fields,
+                size_t depth) {
+        std::vector<size_t> shown;
+        if (fields != nullptr) {
+            // Selected fields, in the order asked, each once; a name the structure lacks is
+            // left out.
+            for (auto name = fields->begin(); name != fields->end(); ++name) {
+                const size_t index = structure.FindField(*name);
+                if (index < structure.FieldCount() &&
+                    std::find(fields->begin(), name, *name) == name) {
+                    shown.push_back(index);
+                }
+            }
+        }
+        const size_t count = fields != nullptr ? shown.size() : structure.FieldCount();
+        if (count == 0) {
+            out_ += "{}";
+            return;
+        }
+        out_ += '{';
+        for (size_t i = 0; i < count; ++i) {
+            if (i != 0) {
+                out_ += ',';
+            }
+            Indent(depth + 1);
+            const auto field = structure.FieldAt(fields != nullptr ? shown[i] : i);
+            String(field.name);
+            out_ += pretty_ ? ": " : ":";
+            Value(field.value.get(), nullptr, depth + 1);
+        }
+        Indent(depth);
+        out_ += '}';
+    }
+
+    void List(const MetaObj::MetaList& list, const std::vector<std::string>* fields, size_t depth) {
+        const auto& elements = list.GetElements();
+        if (elements.empty()) {
+            out_ += "[]";
+            return;
+        }
+        out_ += '[';
+        for (size_t i = 0; i < elements.size(); ++i) {
+            if (i != 0) {
+                out_ += ',';
+            }
+            Indent(depth + 1);
+            // The elements of a list are top-level structures as well.
+            const MetaObject* element = elements[i].get();
+            const bool isStruct = element != nullptr && element->GetType() == MetaObj::META_STRUCT;
+            Value(element, isStruct ? fields : nullptr, depth + 1);
+            if (i == 0 && depth == 0) {
+                // A listing's elements are alike: room for all of them, judged by the first.
+                out_.reserve(out_.size() * elements.size() * 9 / 8);
+            }
+        }
+        Indent(depth);
+        out_ += ']';
+    }
+
+    void String(const std::string& text) {
+        // Printable ASCII without quotation marks or backslashes, most texts, is written as
+        // it is; anything else is escaped by the JSON library.
+        bool plain = true;
+        for (char c : text) {
+            const auto byte = static_cast<unsigned char>(c);
+            plain &= byte >= 0x20 && byte < 0x7F && byte != '"' && byte != '\\';
+        }
+        if (!plain) {
+            out_ += nlohmann::ordered_json(text).dump(-1, ' ', false,
+                                                      nlohmann::json::error_handler_t::replace);
+            return;
+        }
+        out_ += '"';
+        out_ += text;
+        out_ += '"';
+    }
+
+    void Indent(size_t depth) {
+        if (pretty_) {
+            out_ += '\n';
+            out_.append(2 * depth, ' ');
+        }
+    }
+
+    std::string& out_;
+    bool pretty_;
+};
+
+std::string Dump(const MetaObject& root, const FormatOptions& options, bool pretty) {
+    std::string text;
+    JsonWriter(text, pretty).Value(&root, options.fieldsGiven ? &options.fields : nullptr, 0);
+    text += '\n';
+    return text;
 }
 
 }  // namespace
 
 std::string FormatJson(const MetaObject& root, const FormatOptions& options) {
-    return Dump(root, options, -1);
+    return Dump(root, options, false);
 }
 
 std::string FormatJsonPretty(const MetaObject& root, const FormatOptions& options) {
-    return Dump(root, options, 2);
+    return Dump(root, options, true);
 }
 
 }  // namespace App

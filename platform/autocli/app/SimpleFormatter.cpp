@@ -14,12 +14,6 @@ namespace {
 
 constexpr size_t kIndentStep = 3;
 
-void AppendLine(std::string& text, size_t indent, const std::string& line) {
-    text.append(indent, ' ');
-    text += line;
-    text += '\n';
-}
-
 bool IsStructured(const MetaObject* value) {
     if (value == nullptr) {
         return false;
@@ -31,49 +25,109 @@ bool IsStructured(const MetaObject* value) {
            static_cast<const MetaObj::MetaList*>(value)->GetElementType() == MetaObj::META_STRUCT;
 }
 
-void AppendStruct(std::string& text, const MetaStruct& structure, size_t indent,
-                  const OutputLayout& layout, bool topLevel);
+// What SimpleWriter writes before and after each value of a selection: the indented name
+// with its colon, and the unit, all as ScreenText; made again only when the selection
+// changes, since a listing's rows share one.
+struct Lines {
+    unsigned serial = 0;  // of the selection they were made for
+    size_t indent = 0;
+    std::vector<std::string> heads;  // "   Name:"
+    std::vector<std::string> units;  // " unit", or empty
+};
 
-// A structure or list of structures held in a field: its blocks, one level further in.
-void AppendNested(std::string& text, const MetaObject& value, size_t indent,
-                  const OutputLayout& layout) {
-    if (value.GetType() == MetaObj::META_STRUCT) {
-        AppendStruct(text, static_cast<const MetaStruct&>(value), indent, layout, false);
-        return;
+class SimpleWriter {
+  public:
+    SimpleWriter(std::string& text, const OutputLayout& layout) : text_(text), layout_(layout) {}
+
+    // A structure with a title: the title, then its fields indented under it. Without a
+    // title the fields stand at the block's own indentation.
+    void Struct(const MetaStruct& structure, size_t indent, bool topLevel) {
+        size_t fieldIndent = indent;
+        if (layout_.HasTitle(structure.GetName())) {
+            text_.append(indent, ' ');
+            AppendScreenText(text_, layout_.Title(structure));
+            text_ += '\n';
+            fieldIndent += kIndentStep;
+        }
+        if (topLevel) {
+            // Nested structures use the other selection and lines: these stay as they are.
+            const OutputLayout::Selection& selection = layout_.Select(structure, true);
+            Fields(structure, selection, LinesFor(selection, structure, fieldIndent, true),
+                   fieldIndent);
+            return;
+        }
+        const OutputLayout::Selection selection = layout_.Select(structure, false);
+        const Lines lines = LinesFor(selection, structure, fieldIndent, false);
+        Fields(structure, selection, lines, fieldIndent);
     }
-    for (const auto& element : static_cast<const MetaObj::MetaList&>(value).GetElements()) {
-        if (element && element->GetType() == MetaObj::META_STRUCT) {
-            AppendStruct(text, static_cast<const MetaStruct&>(*element), indent, layout, false);
+
+  private:
+    void Fields(const MetaStruct& structure, const OutputLayout::Selection& selection,
+                const Lines& lines, size_t fieldIndent) {
+        for (size_t shown = 0; shown < selection.fields.size(); ++shown) {
+            const MetaObject* value = structure.FieldAt(selection.fields[shown]).value.get();
+            text_ += lines.heads[shown];
+            if (IsStructured(value)) {
+                text_ += '\n';
+                Nested(*value, fieldIndent + kIndentStep);
+                continue;
+            }
+            const size_t colon = text_.size();
+            text_ += ' ';
+            const size_t start = text_.size();
+            if (value != nullptr && value->GetType() == MetaObj::META_STRING) {
+                AppendScreenText(text_, static_cast<const MetaObj::MetaString&>(*value).GetValue());
+            } else {
+                AppendScreenText(text_, ValueText(value));
+            }
+            if (text_.size() == start) {
+                text_.resize(colon);  // no value: "Name:" alone, and no unit
+            } else {
+                text_ += lines.units[shown];
+            }
+            text_ += '\n';
         }
     }
-}
 
-// A structure with a title: the title, then its fields indented under it. Without a title
-// the fields stand at the block's own indentation.
-void AppendStruct(std::string& text, const MetaStruct& structure, size_t indent,
-                  const OutputLayout& layout, bool topLevel) {
-    size_t fieldIndent = indent;
-    if (layout.HasTitle(structure.GetName())) {
-        AppendLine(text, indent, ScreenText(layout.Title(structure)));
-        fieldIndent += kIndentStep;
-    }
-    for (const auto* field : layout.Fields(structure, topLevel)) {
-        const MetaObject* value = field->value.get();
-        if (IsStructured(value)) {
-            AppendLine(text, fieldIndent, ScreenText(field->name) + ":");
-            AppendNested(text, *value, fieldIndent + kIndentStep, layout);
-            continue;
+  private:
+    // A structure or list of structures held in a field: its blocks, one level further in.
+    void Nested(const MetaObject& value, size_t indent) {
+        if (value.GetType() == MetaObj::META_STRUCT) {
+            Struct(static_cast<const MetaStruct&>(value), indent, false);
+            return;
         }
-        // Appended piece by piece: a long listing has tens of thousands of these lines.
-        const std::string shown =
-            ScreenText(ValueText(value, layout.Unit(structure.GetName(), field->name)));
-        text.append(fieldIndent, ' ');
-        text += ScreenText(field->name);
-        text += shown.empty() ? ":" : ": ";
-        text += shown;
-        text += '\n';
+        for (const auto& element : static_cast<const MetaObj::MetaList&>(value).GetElements()) {
+            if (element && element->GetType() == MetaObj::META_STRUCT) {
+                Struct(static_cast<const MetaStruct&>(*element), indent, false);
+            }
+        }
     }
-}
+
+    const Lines& LinesFor(const OutputLayout::Selection& selection, const MetaStruct& structure,
+                          size_t indent, bool topLevel) {
+        Lines& lines = lines_[topLevel ? 1 : 0];
+        if (lines.serial == selection.serial && lines.indent == indent) {
+            return lines;
+        }
+        lines.serial = selection.serial;
+        lines.indent = indent;
+        lines.heads.clear();
+        lines.units.clear();
+        for (size_t shown = 0; shown < selection.fields.size(); ++shown) {
+            std::string head(indent, ' ');
+            AppendScreenText(head, structure.FieldAt(selection.fields[shown]).name);
+            head += ':';
+            lines.heads.push_back(std::move(head));
+            const std::string& unit = selection.units[shown];
+            lines.units.push_back(unit.empty() ? std::string() : " " + ScreenText(unit));
+        }
+        return lines;
+    }
+
+    std::string& text_;
+    const OutputLayout& layout_;
+    Lines lines_[2];
+};
 
 }  // namespace
 
@@ -114,20 +168,26 @@ std::string FormatSimple(const MetaObject& root, const FormatOptions& options) {
     }
     OutputLayout layout(options);
     std::string text;
+    SimpleWriter writer(text, layout);
     if (root.GetType() == MetaObj::META_STRUCT) {
-        AppendStruct(text, static_cast<const MetaStruct&>(root), 0, layout, true);
+        writer.Struct(static_cast<const MetaStruct&>(root), 0, true);
         return text;
     }
+    const auto& elements = static_cast<const MetaObj::MetaList&>(root).GetElements();
     bool first = true;
-    for (const auto& element : static_cast<const MetaObj::MetaList&>(root).GetElements()) {
+    for (const auto& element : elements) {
         if (!element || element->GetType() != MetaObj::META_STRUCT) {
             continue;
         }
-        if (!first) {
-            text += '\n';
+        if (first) {
+            // A listing's rows are alike: room for all of them, judged by the first.
+            writer.Struct(static_cast<const MetaStruct&>(*element), 0, true);
+            text.reserve(text.size() * elements.size() * 9 / 8);
+            first = false;
+            continue;
         }
-        first = false;
-        AppendStruct(text, static_cast<const MetaStruct&>(*element), 0, layout, true);
+        text += '\n';
+        writer.Struct(static_cast<const MetaStruct&>(*element), 0, true);
     }
     return text;
 }

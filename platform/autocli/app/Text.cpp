@@ -231,25 +231,29 @@ std::string MessageText(const std::string& text) {
     return line;
 }
 
-std::string ScreenText(const std::string& text) {
-    static const char kHex[] = "0123456789abcdef";
-    // Most texts hold nothing to escape: plain ASCII comes back as it is.
+bool IsPlainText(const std::string& text) {
+    // No early exit: the loop runs over whole vectors of bytes.
     bool plain = true;
     for (char c : text) {
         const auto byte = static_cast<unsigned char>(c);
-        plain = plain && byte >= 0x20 && byte < 0x7F;
+        plain &= byte >= 0x20 && byte < 0x7F;
     }
-    if (plain) {
-        return text;
+    return plain;
+}
+
+void AppendScreenText(std::string& out, const std::string& text) {
+    // Most texts hold nothing to escape: plain ASCII goes out as it is.
+    if (IsPlainText(text)) {
+        out += text;
+        return;
     }
-    const auto hex = [](const char* prefix, char32_t value, int digits) {
-        std::string escaped = prefix;
+    static const char kHex[] = "0123456789abcdef";
+    const auto hex = [&out](const char* prefix, char32_t value, int digits) {
+        out += prefix;
         for (int shift = 4 * (digits - 1); shift >= 0; shift -= 4) {
-            escaped += kHex[(value >> shift) & 0xF];
+            out += kHex[(value >> shift) & 0xF];
         }
-        return escaped;
     };
-    std::string shown;
     size_t pos = 0;
     while (pos < text.size()) {
         char32_t codePoint;
@@ -257,25 +261,37 @@ std::string ScreenText(const std::string& text) {
         const auto byte = static_cast<unsigned char>(text[pos]);
         if (length == 0) {
             // A stray byte: a terminal reading 8-bit controls would obey 0x80 to 0x9F.
-            shown += byte < 0xA0 ? hex("\\x", byte, 2) : std::string(1, text[pos]);
+            if (byte < 0xA0) {
+                hex("\\x", byte, 2);
+            } else {
+                out += text[pos];
+            }
             ++pos;
             continue;
         }
         if (codePoint == '\n') {
-            shown += "\\n";
+            out += "\\n";
         } else if (codePoint == '\r') {
-            shown += "\\r";
+            out += "\\r";
         } else if (codePoint == '\t') {
-            shown += "\\t";
+            out += "\\t";
         } else if (codePoint < 0x20 || codePoint == 0x7F) {
-            shown += hex("\\x", codePoint, 2);
+            hex("\\x", codePoint, 2);
         } else if (codePoint >= 0x80 && codePoint < 0xA0) {
-            shown += hex("\\u", codePoint, 4);
+            hex("\\u", codePoint, 4);
         } else {
-            shown.append(text, pos, length);
+            out.append(text, pos, length);
         }
         pos += length;
     }
+}
+
+std::string ScreenText(const std::string& text) {
+    if (IsPlainText(text)) {
+        return text;
+    }
+    std::string shown;
+    AppendScreenText(shown, text);
     return shown;
 }
 

@@ -42,6 +42,10 @@ std::string MessageText(const std::string& text);
 // "\t", "\x1b", "\u009b", "\x9b"), so that no value can move the cursor, retitle the
 // window or clear the screen. Other text, invalid UTF-8 included, is kept as it is.
 std::string ScreenText(const std::string& text);
+// ScreenText(text) appended to `out`.
+void AppendScreenText(std::string& out, const std::string& text);
+// Whether the text is printable ASCII only, which ScreenText leaves as it is.
+bool IsPlainText(const std::string& text);
 
 // The text padded with blanks to `width` display characters.
 std::string PadRight(const std::string& text, size_t width);

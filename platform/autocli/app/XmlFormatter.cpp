@@ -125,23 +125,21 @@ void AppendValue(std::string& text, const MetaObject* value, size_t indent,
         const auto& structure = static_cast<const MetaObj::MetaStruct&>(*value);
         AppendLine(text, indent,
                    "<structure name=\"" + EscapeAttribute(structure.GetName()) + "\">");
-        std::vector<const MetaObj::MetaStruct::Field*> shown;
-        for (const auto& field : structure.GetFields()) {
-            shown.push_back(&field);
-        }
-        if (fields != nullptr) {
-            shown.clear();
+        std::vector<size_t> shown;
+        if (fields == nullptr) {
+            for (size_t i = 0; i < structure.FieldCount(); ++i) {
+                shown.push_back(i);
+            }
+        } else {
             for (const auto& name : *fields) {
-                for (const auto& field : structure.GetFields()) {
-                    if (field.name == name) {
-                        shown.push_back(&field);
-                        break;
-                    }
+                const size_t index = structure.FindField(name);
+                if (index < structure.FieldCount()) {
+                    shown.push_back(index);
                 }
             }
         }
-        for (const auto* fieldPointer : shown) {
-            const auto& field = *fieldPointer;
+        for (size_t index : shown) {
+            const auto field = structure.FieldAt(index);
             std::string open = "<field name=\"" + EscapeAttribute(field.name) + "\">";
             if (IsScalar(field.value.get())) {
                 AppendLine(text, indent + kIndentStep,
