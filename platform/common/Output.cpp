@@ -57,6 +57,11 @@ int WriteAll(int fd, const char* data, size_t size) {
 
 void Out(const std::string& text) {
     if (failure != 0) return;
+    if (pending.empty() && text.size() >= kFlushAt) {
+        // A large text goes out as it is, without a copy.
+        failure = WriteAll(STDOUT_FILENO, text.data(), text.size());
+        return;
+    }
     pending += text;
     if (pending.size() >= kFlushAt) Flush();
 }

@@ -132,6 +132,7 @@ RunResult RunCommand(CommandSpec& command, const std::vector<std::string>& words
             std::string("output complete: ") + (output->IsComplete() ? "yes" : "no") + "\n";
     }
     result.status = output->GetErrorMessages().empty() ? kExitSuccess : kExitCommandFailed;
+    result.result = std::move(output);
     return result;
 }
 

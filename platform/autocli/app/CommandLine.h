@@ -20,6 +20,9 @@ struct RunResult {
     int status = kExitSuccess;
     std::string out;  // help and results
     std::string err;  // errors, one per line
+    // The command's result, for the caller to release when it likes: a process about to end
+    // need not free it value by value.
+    std::shared_ptr<const void> result;
 };
 
 // Runs `autocli [global options] <namespace>... <command> [options]` over the tree at `root`

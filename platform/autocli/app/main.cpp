@@ -19,6 +19,13 @@ std::string DefaultPluginPath() {
     return beside.empty() ? std::string() : beside + "/" + AUTOCLI_PLUGIN_DIR_FROM_EXECUTABLE;
 }
 
+// Holds objects until the process ends, without destroying them: they stay reachable, so
+// leak checkers do not count them.
+void KeepUntilExit(std::shared_ptr<const void> object) {
+    static auto* kept = new std::vector<std::shared_ptr<const void>>();
+    kept->push_back(std::move(object));
+}
+
 }  // namespace
 
 int main(int argc, char** argv) {
@@ -63,6 +70,10 @@ int main(int argc, char** argv) {
     }
 
     App::RunResult result = App::Run(std::vector<std::string>(argv + 1, argv + argc), root);
+    // The tree and the result stay until the process ends: freeing them object by object
+    // would take longer than printing a large result.
+    KeepUntilExit(std::move(root));
+    KeepUntilExit(std::move(result.result));
     Output::Out(result.out);
     Output::Err(result.err);
     return Output::Finish("autocli", result.status);
