@@ -36,27 +36,27 @@ using ZuvCtl::Mesk::MeskUtil;
 namespace {
 
 // The report's fields, in the order shown; ExecuteInternal fills them by these names.
-constexpr OutputField kEnabled{"Enabled", META_BOOL};
-constexpr OutputField kCurrentLocalTime{"Current Local Time", META_STRING};
-constexpr OutputField kLocalNodeUuid{"Local Node UUID", META_STRING};
-constexpr OutputField kLocalNodeType{"Local Node Type", META_STRING};
-constexpr OutputField kLocalNodeState{"Local Node State", META_STRING};
-constexpr OutputField kLocalNodeHealthState{"Local Node Health State", META_STRING};
-constexpr OutputField kMasterUuid{"Sub-Cluster Master UUID", META_STRING};
-constexpr OutputField kBackupUuid{"Sub-Cluster Backup UUID", META_STRING};
-constexpr OutputField kClusterUuid{"Sub-Cluster UUID", META_STRING};
-constexpr OutputField kMembershipEntryRevision{"Sub-Cluster Membership Entry Revision", META_INT};
-constexpr OutputField kMemberCount{"Sub-Cluster Member Count", META_INT};
-constexpr OutputField kMemberUuids{"Sub-Cluster Member UUIDs", META_LIST};
-constexpr OutputField kMembershipUuid{"Sub-Cluster Membership UUID", META_STRING};
-constexpr OutputField kUnicastModeEnabled{"Unicast Mode Enabled", META_BOOL};
-constexpr OutputField kMaintenanceModeState{"Maintenance Mode State", META_STRING};
-constexpr OutputField kConfigGeneration{"Config Generation", META_STRING};
-constexpr OutputField kFields[] = {
-    kEnabled,        kCurrentLocalTime,        kLocalNodeUuid,        kLocalNodeType,
-    kLocalNodeState, kLocalNodeHealthState,    kMasterUuid,           kBackupUuid,
-    kClusterUuid,    kMembershipEntryRevision, kMemberCount,          kMemberUuids,
-    kMembershipUuid, kUnicastModeEnabled,      kMaintenanceModeState, kConfigGeneration};
+const OutputField kEnabled{"Enabled", META_BOOL};
+const OutputField kCurrentLocalTime{"Current Local Time", META_STRING};
+const OutputField kLocalNodeUuid{"Local Node UUID", META_STRING};
+const OutputField kLocalNodeType{"Local Node Type", META_STRING};
+const OutputField kLocalNodeState{"Local Node State", META_STRING};
+const OutputField kLocalNodeHealthState{"Local Node Health State", META_STRING};
+const OutputField kMasterUuid{"Sub-Cluster Master UUID", META_STRING};
+const OutputField kBackupUuid{"Sub-Cluster Backup UUID", META_STRING};
+const OutputField kClusterUuid{"Sub-Cluster UUID", META_STRING};
+const OutputField kMembershipEntryRevision{"Sub-Cluster Membership Entry Revision", META_INT};
+const OutputField kMemberCount{"Sub-Cluster Member Count", META_INT};
+const OutputField kMemberUuids{"Sub-Cluster Member UUIDs", META_LIST};
+const OutputField kMembershipUuid{"Sub-Cluster Membership UUID", META_STRING};
+const OutputField kUnicastModeEnabled{"Unicast Mode Enabled", META_BOOL};
+const OutputField kMaintenanceModeState{"Maintenance Mode State", META_STRING};
+const OutputField kConfigGeneration{"Config Generation", META_STRING};
+const OutputField* const kFields[] = {
+    &kEnabled,        &kCurrentLocalTime,        &kLocalNodeUuid,        &kLocalNodeType,
+    &kLocalNodeState, &kLocalNodeHealthState,    &kMasterUuid,           &kBackupUuid,
+    &kClusterUuid,    &kMembershipEntryRevision, &kMemberCount,          &kMemberUuids,
+    &kMembershipUuid, &kUnicastModeEnabled,      &kMaintenanceModeState, &kConfigGeneration};
 
 // The configuration generation's timestamp (milliseconds since the epoch) as local time with
 // three-digit milliseconds and no zone suffix, e.g. "2017-07-14T02:40:00.007". A timestamp
@@ -154,27 +154,27 @@ void ClusterGet::ExecuteInternal(std::shared_ptr<Input> /*input*/, std::shared_p
 
             // The local time is read last, after every other query, so that it is the time
             // at which the report was put together.
-            result->SetField(kEnabled.name, MetaBool::New(config.enabled), doc);
-            result->SetField(kCurrentLocalTime.name,
+            result->SetField(kEnabled.Text(), MetaBool::New(config.enabled), doc);
+            result->SetField(kCurrentLocalTime.Text(),
                              MetaString::New(MeskUtil::GetFormattedSystemDateTime()), doc);
-            result->SetField(kLocalNodeUuid.name, MetaString::New(localNodeUuid), doc);
-            result->SetField(kLocalNodeType.name, MetaString::New(nodeType), doc);
-            result->SetField(kLocalNodeState.name, MetaString::New(localNodeState), doc);
-            result->SetField(kLocalNodeHealthState.name, MetaString::New(localNodeHealthState),
+            result->SetField(kLocalNodeUuid.Text(), MetaString::New(localNodeUuid), doc);
+            result->SetField(kLocalNodeType.Text(), MetaString::New(nodeType), doc);
+            result->SetField(kLocalNodeState.Text(), MetaString::New(localNodeState), doc);
+            result->SetField(kLocalNodeHealthState.Text(), MetaString::New(localNodeHealthState),
                              doc);
-            result->SetField(kMasterUuid.name, MetaString::New(masterUuid), doc);
-            result->SetField(kBackupUuid.name, MetaString::New(backupUuid), doc);
-            result->SetField(kClusterUuid.name, MetaString::New(config.clusterUuid), doc);
-            result->SetField(kMembershipEntryRevision.name,
+            result->SetField(kMasterUuid.Text(), MetaString::New(masterUuid), doc);
+            result->SetField(kBackupUuid.Text(), MetaString::New(backupUuid), doc);
+            result->SetField(kClusterUuid.Text(), MetaString::New(config.clusterUuid), doc);
+            result->SetField(kMembershipEntryRevision.Text(),
                              MetaInt::New(static_cast<int64_t>(membershipEntryRevision)), doc);
-            result->SetField(kMemberCount.name, MetaInt::New(static_cast<int64_t>(members.size())),
+            result->SetField(kMemberCount.Text(),
+                             MetaInt::New(static_cast<int64_t>(members.size())), doc);
+            result->SetField(kMemberUuids.Text(), memberUuids, doc);
+            result->SetField(kMembershipUuid.Text(), MetaString::New(membershipUuid), doc);
+            result->SetField(kUnicastModeEnabled.Text(), MetaBool::New(unicastMode), doc);
+            result->SetField(kMaintenanceModeState.Text(), MetaString::New(maintenanceModeState),
                              doc);
-            result->SetField(kMemberUuids.name, memberUuids, doc);
-            result->SetField(kMembershipUuid.name, MetaString::New(membershipUuid), doc);
-            result->SetField(kUnicastModeEnabled.name, MetaBool::New(unicastMode), doc);
-            result->SetField(kMaintenanceModeState.name, MetaString::New(maintenanceModeState),
-                             doc);
-            result->SetField(kConfigGeneration.name, MetaString::New(configGeneration), doc);
+            result->SetField(kConfigGeneration.Text(), MetaString::New(configGeneration), doc);
         }
     } catch (const MeskCtlException& e) {
         output->AddErrorMessage(e.GetMessage());

@@ -24,9 +24,9 @@ using ZuvCtl::Mesk::MeskUtil;
 namespace {
 
 // The result's fields, in the order shown; ExecuteInternal fills them by these names.
-constexpr OutputField kName{"Preferred Fault Domain Name", META_STRING};
-constexpr OutputField kId{"Preferred Fault Domain Id", META_STRING};
-constexpr OutputField kFields[] = {kName, kId};
+const OutputField kName{"Preferred Fault Domain Name", META_STRING};
+const OutputField kId{"Preferred Fault Domain Id", META_STRING};
+const OutputField* const kFields[] = {&kName, &kId};
 
 }  // namespace
 
@@ -77,8 +77,8 @@ void ClusterPreferredFaultDomainGet::ExecuteInternal(std::shared_ptr<Input> /*in
         MeskUtil::GetPreferredFaultDomainInfo(id, name);
 
         auto result = GetOutputStructure();
-        result->SetField(kName.name, MetaString::New(name), MetaStruct::_docEmpty);
-        result->SetField(kId.name, MetaString::New(id), MetaStruct::_docEmpty);
+        result->SetField(kName.Text(), MetaString::New(name), MetaStruct::_docEmpty);
+        result->SetField(kId.Text(), MetaString::New(id), MetaStruct::_docEmpty);
         output->SetRootObject(result);
         output->SetComplete();
     } catch (const MeskCtlException& e) {

@@ -32,14 +32,14 @@ using ZuvCtl::Mesk::MeskUtil;
 namespace {
 
 // An agent's fields, in the order shown; ExecuteInternal fills them by these names.
-constexpr OutputField kNodeUuid{"NodeUuid", META_STRING};
-constexpr OutputField kIsWitness{"IsWitness", META_INT};
-constexpr OutputField kSupportsUnicast{"Supports Unicast", META_BOOL};
-constexpr OutputField kIpAddress{"IP Address", META_STRING};
-constexpr OutputField kPort{"Port", META_INT};
-constexpr OutputField kIfaceName{"Iface Name", META_STRING};
-constexpr OutputField kFields[] = {kNodeUuid,  kIsWitness, kSupportsUnicast,
-                                   kIpAddress, kPort,      kIfaceName};
+const OutputField kNodeUuid{"NodeUuid", META_STRING};
+const OutputField kIsWitness{"IsWitness", META_INT};
+const OutputField kSupportsUnicast{"Supports Unicast", META_BOOL};
+const OutputField kIpAddress{"IP Address", META_STRING};
+const OutputField kPort{"Port", META_INT};
+const OutputField kIfaceName{"Iface Name", META_STRING};
+const OutputField* const kFields[] = {&kNodeUuid,  &kIsWitness, &kSupportsUnicast,
+                                      &kIpAddress, &kPort,      &kIfaceName};
 
 // A number field as atoi reads it: leading blanks and digits only, so "yes" or "" is 0.
 int AtoI(const std::string& text) {
@@ -128,22 +128,22 @@ void ClusterUnicastAgentList::ExecuteInternal(std::shared_ptr<Input> /*input*/,
             }
 
             auto agent = GetOutputStructure();
-            agent->SetField(kNodeUuid.name,
+            agent->SetField(kNodeUuid.Text(),
                             MetaString::New(fields.Text(UnicastAgentEntry::kNodeUuid)),
                             MetaStruct::_docEmpty);
-            agent->SetField(kIsWitness.name,
+            agent->SetField(kIsWitness.Text(),
                             MetaInt::New(AtoI(fields.Text(UnicastAgentEntry::kIsWitness))),
                             MetaStruct::_docEmpty);
             agent->SetField(
-                kSupportsUnicast.name,
+                kSupportsUnicast.Text(),
                 MetaBool::New(AtoI(fields.Text(UnicastAgentEntry::kSupportsUnicast)) != 0),
                 MetaStruct::_docEmpty);
             // The address is shown as the library gave it, unchecked.
-            agent->SetField(kIpAddress.name, MetaString::New(fields.Text(UnicastAgentEntry::kIp)),
+            agent->SetField(kIpAddress.Text(), MetaString::New(fields.Text(UnicastAgentEntry::kIp)),
                             MetaStruct::_docEmpty);
-            agent->SetField(kPort.name, MetaInt::New(AtoI(fields.Text(UnicastAgentEntry::kPort))),
+            agent->SetField(kPort.Text(), MetaInt::New(AtoI(fields.Text(UnicastAgentEntry::kPort))),
                             MetaStruct::_docEmpty);
-            agent->SetField(kIfaceName.name,
+            agent->SetField(kIfaceName.Text(),
                             MetaString::New(fields.Text(UnicastAgentEntry::kIfaceName)),
                             MetaStruct::_docEmpty);
             agents->Add(agent);

@@ -20,8 +20,8 @@ using Kalmor::MetaObj::MetaStruct;
 namespace {
 
 // The result's fields; ExecuteInternal fills them by these names.
-constexpr OutputField kName{"Name", META_STRING};
-constexpr OutputField kFields[] = {kName};
+const OutputField kName{"Name", META_STRING};
+const OutputField* const kFields[] = {&kName};
 
 }  // namespace
 
@@ -59,7 +59,7 @@ void DatastoreNameGet::ExecuteInternal(std::shared_ptr<Input> /*input*/,
         auto result = GetOutputStructure();
         auto plugin = HostCtl::MeskPluginFactory::GetMeskPlugin();
         auto info = plugin->GetMeskInfo();
-        result->SetField(kName.name, MetaString::New(info->GetDatastoreName()),
+        result->SetField(kName.Text(), MetaString::New(info->GetDatastoreName()),
                          MetaStruct::_docEmpty);
         output->SetRootObject(result);
         output->SetComplete();

@@ -23,9 +23,9 @@ using Kalmor::MetaObj::MetaStruct;
 namespace {
 
 // The result's fields, in the order shown; ExecuteInternal fills them by these names.
-constexpr OutputField kFaultDomainName{"faultDomainName", META_STRING};
-constexpr OutputField kFaultDomainId{"faultDomainId", META_STRING};
-constexpr OutputField kFields[] = {kFaultDomainName, kFaultDomainId};
+const OutputField kFaultDomainName{"faultDomainName", META_STRING};
+const OutputField kFaultDomainId{"faultDomainId", META_STRING};
+const OutputField* const kFields[] = {&kFaultDomainName, &kFaultDomainId};
 
 }  // namespace
 
@@ -63,7 +63,7 @@ void FaultDomainGet::ExecuteInternal(std::shared_ptr<Input> /*input*/,
         auto result = GetOutputStructure();
         auto plugin = HostCtl::MeskPluginFactory::GetMeskPlugin();
         auto info = plugin->GetMeskInfo();
-        result->SetField(kFaultDomainName.name, MetaString::New(info->GetFaultDomainName()),
+        result->SetField(kFaultDomainName.Text(), MetaString::New(info->GetFaultDomainName()),
                          MetaStruct::_docEmpty);
         // A host outside any cluster has no fault domain identifier; it is not asked for then,
         // and the field stays empty.
@@ -71,7 +71,7 @@ void FaultDomainGet::ExecuteInternal(std::shared_ptr<Input> /*input*/,
         if (info->GetClusterConfig().enabled) {
             id = ZuvCtl::Mesk::MeskUtil::GetFaultDomainId();
         }
-        result->SetField(kFaultDomainId.name, MetaString::New(id), MetaStruct::_docEmpty);
+        result->SetField(kFaultDomainId.Text(), MetaString::New(id), MetaStruct::_docEmpty);
         output->SetRootObject(result);
         output->SetComplete();
     } catch (const MeskCtlException& e) {

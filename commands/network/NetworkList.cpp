@@ -30,22 +30,22 @@ using Kalmor::MetaObj::MetaStruct;
 namespace {
 
 // An interface's fields, in the order shown; ExecuteInternal fills them by these names.
-constexpr OutputField kZuvNicName{"ZuvNic Name", META_STRING};
-constexpr OutputField kIpProtocol{"IP Protocol", META_STRING};
-constexpr OutputField kInterfaceUuid{"Interface UUID", META_STRING};
-constexpr OutputField kAgentGroupAddress{"Agent Group Multicast Address", META_STRING};
+const OutputField kZuvNicName{"ZuvNic Name", META_STRING};
+const OutputField kIpProtocol{"IP Protocol", META_STRING};
+const OutputField kInterfaceUuid{"Interface UUID", META_STRING};
+const OutputField kAgentGroupAddress{"Agent Group Multicast Address", META_STRING};
 constexpr OutputField kAgentGroupV6Address{"Agent Group IPv6 Multicast Address", META_STRING};
-constexpr OutputField kAgentGroupPort{"Agent Group Multicast Port", META_INT};
-constexpr OutputField kMasterGroupAddress{"Master Group Multicast Address", META_STRING};
+const OutputField kAgentGroupPort{"Agent Group Multicast Port", META_INT};
+const OutputField kMasterGroupAddress{"Master Group Multicast Address", META_STRING};
 constexpr OutputField kMasterGroupV6Address{"Master Group IPv6 Multicast Address", META_STRING};
-constexpr OutputField kMasterGroupPort{"Master Group Multicast Port", META_INT};
-constexpr OutputField kUnicastPort{"Host Unicast Channel Bound Port", META_INT};
-constexpr OutputField kMulticastTtl{"Multicast TTL", META_INT};
-constexpr OutputField kTrafficType{"Traffic Type", META_STRING};
-constexpr OutputField kFields[] = {kZuvNicName,         kIpProtocol,           kInterfaceUuid,
-                                   kAgentGroupAddress,  kAgentGroupV6Address,  kAgentGroupPort,
-                                   kMasterGroupAddress, kMasterGroupV6Address, kMasterGroupPort,
-                                   kUnicastPort,        kMulticastTtl,         kTrafficType};
+const OutputField kMasterGroupPort{"Master Group Multicast Port", META_INT};
+const OutputField kUnicastPort{"Host Unicast Channel Bound Port", META_INT};
+const OutputField kMulticastTtl{"Multicast TTL", META_INT};
+const OutputField kTrafficType{"Traffic Type", META_STRING};
+const OutputField* const kFields[] = {
+    &kZuvNicName,          &kIpProtocol,     &kInterfaceUuid,      &kAgentGroupAddress,
+    &kAgentGroupV6Address, &kAgentGroupPort, &kMasterGroupAddress, &kMasterGroupV6Address,
+    &kMasterGroupPort,     &kUnicastPort,    &kMulticastTtl,       &kTrafficType};
 
 }  // namespace
 
@@ -93,35 +93,36 @@ void NetworkList::ExecuteInternal(std::shared_ptr<Input> /*input*/,
         auto configs = info2->GetZuvNicConfigs();
         for (const auto& config : configs) {
             auto entry = GetOutputStructure();
-            entry->SetField(kZuvNicName.name, MetaString::New(config->GetZuvnicName()),
+            entry->SetField(kZuvNicName.Text(), MetaString::New(config->GetZuvnicName()),
                             MetaStruct::_docEmpty);
             // Every interface is an IP interface, whichever kind its groups are.
-            entry->SetField(kIpProtocol.name, MetaString::New("IP"), MetaStruct::_docEmpty);
-            entry->SetField(kInterfaceUuid.name, MetaString::New(config->GetIfaceUuid()),
+            entry->SetField(kIpProtocol.Text(), MetaString::New("IP"), MetaStruct::_docEmpty);
+            entry->SetField(kInterfaceUuid.Text(), MetaString::New(config->GetIfaceUuid()),
                             MetaStruct::_docEmpty);
-            entry->SetField(kAgentGroupAddress.name,
+            entry->SetField(kAgentGroupAddress.Text(),
                             MetaString::New(config->GetAgentMulticastGroup().GetStringAddress()),
                             MetaStruct::_docEmpty);
             entry->SetField(kAgentGroupV6Address.name,
                             MetaString::New(config->GetAgentV6MulticastGroup().GetStringAddress()),
                             MetaStruct::_docEmpty);
-            entry->SetField(kAgentGroupPort.name, MetaInt::New(config->GetAgentMulticastPort()),
+            entry->SetField(kAgentGroupPort.Text(), MetaInt::New(config->GetAgentMulticastPort()),
                             MetaStruct::_docEmpty);
-            entry->SetField(kMasterGroupAddress.name,
+            entry->SetField(kMasterGroupAddress.Text(),
                             MetaString::New(config->GetMasterMulticastGroup().GetStringAddress()),
                             MetaStruct::_docEmpty);
             entry->SetField(kMasterGroupV6Address.name,
                             MetaString::New(config->GetMasterV6MulticastGroup().GetStringAddress()),
                             MetaStruct::_docEmpty);
-            entry->SetField(kMasterGroupPort.name, MetaInt::New(config->GetMasterMulticastPort()),
+            entry->SetField(kMasterGroupPort.Text(), MetaInt::New(config->GetMasterMulticastPort()),
                             MetaStruct::_docEmpty);
-            entry->SetField(kUnicastPort.name, MetaInt::New(config->GetHostUnicastPort()),
+            entry->SetField(kUnicastPort.Text(), MetaInt::New(config->GetHostUnicastPort()),
                             MetaStruct::_docEmpty);
-            entry->SetField(kMulticastTtl.name, MetaInt::New(config->GetMulticastTTL()),
+            entry->SetField(kMulticastTtl.Text(), MetaInt::New(config->GetMulticastTTL()),
                             MetaStruct::_docEmpty);
             std::vector<std::string> types;
             config->GetTrafficTypes(types);
-            entry->SetField(kTrafficType.name, MetaString::New(boost::algorithm::join(types, ", ")),
+            entry->SetField(kTrafficType.Text(),
+                            MetaString::New(boost::algorithm::join(types, ", ")),
                             MetaStruct::_docEmpty);
             list->Add(entry);
         }

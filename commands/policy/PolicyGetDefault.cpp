@@ -29,9 +29,9 @@ using ZuvCtl::Mesk::MeskUtil;
 namespace {
 
 // A row's fields, in the order shown; ExecuteInternal fills them by these names.
-constexpr OutputField kPolicyClass{"Policy Class", META_STRING};
-constexpr OutputField kPolicyValue{"Policy Value", META_STRING};
-constexpr OutputField kFields[] = {kPolicyClass, kPolicyValue};
+const OutputField kPolicyClass{"Policy Class", META_STRING};
+const OutputField kPolicyValue{"Policy Value", META_STRING};
+const OutputField* const kFields[] = {&kPolicyClass, &kPolicyValue};
 
 // The policy class names the user may give, each allowed value described by itself.
 std::shared_ptr<ParameterConstraint> PolicyClassConstraint() {
@@ -109,8 +109,8 @@ void PolicyGetDefault::ExecuteInternal(std::shared_ptr<Input> input,
             try {
                 const std::string value = info->GetDefaultPolicy(name);
                 auto row = GetOutputStructure();
-                row->SetField(kPolicyClass.name, MetaString::New(name), MetaStruct::_docEmpty);
-                row->SetField(kPolicyValue.name, MetaString::New(value), MetaStruct::_docEmpty);
+                row->SetField(kPolicyClass.Text(), MetaString::New(name), MetaStruct::_docEmpty);
+                row->SetField(kPolicyValue.Text(), MetaString::New(value), MetaStruct::_docEmpty);
                 result->Add(row);
             } catch (const MeskCtlException&) {
                 // A class whose default cannot be read is left out of the table without a

@@ -20,8 +20,8 @@ using Kalmor::MetaObj::MetaStruct;
 namespace {
 
 // The result's fields; ExecuteInternal fills them by these names.
-constexpr OutputField kRate{"Rate", META_INT};
-constexpr OutputField kFields[] = {kRate};
+const OutputField kRate{"Rate", META_INT};
+const OutputField* const kFields[] = {&kRate};
 
 }  // namespace
 
@@ -61,7 +61,7 @@ void ResyncBandwidthGet::ExecuteInternal(std::shared_ptr<Input> /*input*/,
         auto result = GetOutputStructure();
         auto plugin = HostCtl::MeskPluginFactory::GetMeskPlugin();
         auto info = plugin->GetMeskInfo();
-        result->SetField(kRate.name, MetaInt::New(info->GetResyncBandwidth()),
+        result->SetField(kRate.Text(), MetaInt::New(info->GetResyncBandwidth()),
                          MetaStruct::_docEmpty);
         output->SetRootObject(result);
     } catch (const MeskCtlException& e) {

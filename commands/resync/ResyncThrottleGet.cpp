@@ -20,8 +20,8 @@ using Kalmor::MetaObj::MetaStruct;
 namespace {
 
 // The result's fields; ExecuteInternal fills them by these names.
-constexpr OutputField kLevel{"Level", META_INT};
-constexpr OutputField kFields[] = {kLevel};
+const OutputField kLevel{"Level", META_INT};
+const OutputField* const kFields[] = {&kLevel};
 
 }  // namespace
 
@@ -59,7 +59,7 @@ void ResyncThrottleGet::ExecuteInternal(std::shared_ptr<Input> /*input*/,
         auto result = GetOutputStructure();
         auto plugin = HostCtl::MeskPluginFactory::GetMeskPlugin();
         auto info = plugin->GetMeskInfo();
-        result->SetField(kLevel.name, MetaInt::New(info->GetResyncThrottle()),
+        result->SetField(kLevel.Text(), MetaInt::New(info->GetResyncThrottle()),
                          MetaStruct::_docEmpty);
         output->SetRootObject(result);
     } catch (const MeskCtlException& e) {

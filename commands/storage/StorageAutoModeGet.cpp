@@ -20,8 +20,8 @@ using Kalmor::MetaObj::MetaStruct;
 namespace {
 
 // The result's fields; ExecuteInternal fills them by these names.
-constexpr OutputField kEnabled{"Enabled", META_BOOL};
-constexpr OutputField kFields[] = {kEnabled};
+const OutputField kEnabled{"Enabled", META_BOOL};
+const OutputField* const kFields[] = {&kEnabled};
 
 }  // namespace
 
@@ -60,7 +60,7 @@ void StorageAutoModeGet::ExecuteInternal(std::shared_ptr<Input> /*input*/,
         auto result = GetOutputStructure();
         auto plugin = HostCtl::MeskPluginFactory::GetMeskPlugin();
         auto info = plugin->GetMeskInfo();
-        result->SetField(kEnabled.name, MetaBool::New(info->GetAutoClaimMode()),
+        result->SetField(kEnabled.Text(), MetaBool::New(info->GetAutoClaimMode()),
                          MetaStruct::_docEmpty);
         output->SetRootObject(result);
         output->SetComplete();

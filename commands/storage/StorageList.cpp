@@ -35,27 +35,27 @@ using ZuvCtl::Mesk::MeskUtil;
 namespace {
 
 // A disk's fields, in the order shown; ExecuteInternal fills them by these names.
-constexpr OutputField kDevice{"Device", META_STRING};
-constexpr OutputField kDisplayName{"Display Name", META_STRING};
-constexpr OutputField kIsSsd{"Is SSD", META_BOOL};
-constexpr OutputField kMeskUuid{"MESK UUID", META_STRING};
-constexpr OutputField kDiskGroupUuid{"MESK Disk Group UUID", META_STRING};
-constexpr OutputField kDiskGroupName{"MESK Disk Group Name", META_STRING};
-constexpr OutputField kUsedByThisHost{"Used by this host", META_BOOL};
-constexpr OutputField kInKovra{"In KOVRA", META_BOOL};
-constexpr OutputField kFormatVersion{"On-disk format version", META_STRING};
-constexpr OutputField kDeduplication{"Deduplication", META_BOOL};
-constexpr OutputField kCompression{"Compression", META_BOOL};
-constexpr OutputField kChecksum{"Checksum", META_STRING};
-constexpr OutputField kChecksumOk{"Checksum OK", META_BOOL};
-constexpr OutputField kIsCapacityTier{"Is Capacity Tier", META_BOOL};
-constexpr OutputField kEncryption{"Encryption", META_BOOL};
-constexpr OutputField kDiskKeyLoaded{"DiskKeyLoaded", META_BOOL};
-constexpr OutputField kFields[] = {
-    kDevice,        kDisplayName,    kIsSsd,          kMeskUuid,
-    kDiskGroupUuid, kDiskGroupName,  kUsedByThisHost, kInKovra,
-    kFormatVersion, kDeduplication,  kCompression,    kChecksum,
-    kChecksumOk,    kIsCapacityTier, kEncryption,     kDiskKeyLoaded};
+const OutputField kDevice{"Device", META_STRING};
+const OutputField kDisplayName{"Display Name", META_STRING};
+const OutputField kIsSsd{"Is SSD", META_BOOL};
+const OutputField kMeskUuid{"MESK UUID", META_STRING};
+const OutputField kDiskGroupUuid{"MESK Disk Group UUID", META_STRING};
+const OutputField kDiskGroupName{"MESK Disk Group Name", META_STRING};
+const OutputField kUsedByThisHost{"Used by this host", META_BOOL};
+const OutputField kInKovra{"In KOVRA", META_BOOL};
+const OutputField kFormatVersion{"On-disk format version", META_STRING};
+const OutputField kDeduplication{"Deduplication", META_BOOL};
+const OutputField kCompression{"Compression", META_BOOL};
+const OutputField kChecksum{"Checksum", META_STRING};
+const OutputField kChecksumOk{"Checksum OK", META_BOOL};
+const OutputField kIsCapacityTier{"Is Capacity Tier", META_BOOL};
+const OutputField kEncryption{"Encryption", META_BOOL};
+const OutputField kDiskKeyLoaded{"DiskKeyLoaded", META_BOOL};
+const OutputField* const kFields[] = {
+    &kDevice,        &kDisplayName,    &kIsSsd,          &kMeskUuid,
+    &kDiskGroupUuid, &kDiskGroupName,  &kUsedByThisHost, &kInKovra,
+    &kFormatVersion, &kDeduplication,  &kCompression,    &kChecksum,
+    &kChecksumOk,    &kIsCapacityTier, &kEncryption,     &kDiskKeyLoaded};
 
 }  // namespace
 
@@ -175,27 +175,29 @@ void StorageList::ExecuteInternal(std::shared_ptr<Input> input, std::shared_ptr<
             // The record holds one name and one deduplication flag; each shows under two fields.
             auto name = MetaString::New(disk.name);
             auto deduplication = MetaBool::New(disk.deduplication);
-            row->SetField(kDevice.name, name, MetaStruct::_docEmpty);
-            row->SetField(kDisplayName.name, name, MetaStruct::_docEmpty);
-            row->SetField(kIsSsd.name, MetaBool::New(disk.isSsd), MetaStruct::_docEmpty);
-            row->SetField(kMeskUuid.name, MetaString::New(disk.meskUuid), MetaStruct::_docEmpty);
-            row->SetField(kDiskGroupUuid.name, MetaString::New(disk.diskGroupUuid),
+            row->SetField(kDevice.Text(), name, MetaStruct::_docEmpty);
+            row->SetField(kDisplayName.Text(), name, MetaStruct::_docEmpty);
+            row->SetField(kIsSsd.Text(), MetaBool::New(disk.isSsd), MetaStruct::_docEmpty);
+            row->SetField(kMeskUuid.Text(), MetaString::New(disk.meskUuid), MetaStruct::_docEmpty);
+            row->SetField(kDiskGroupUuid.Text(), MetaString::New(disk.diskGroupUuid),
                           MetaStruct::_docEmpty);
-            row->SetField(kDiskGroupName.name, MetaString::New(disk.diskGroupName),
+            row->SetField(kDiskGroupName.Text(), MetaString::New(disk.diskGroupName),
                           MetaStruct::_docEmpty);
-            row->SetField(kUsedByThisHost.name, MetaBool::New(disk.usedByThisHost),
+            row->SetField(kUsedByThisHost.Text(), MetaBool::New(disk.usedByThisHost),
                           MetaStruct::_docEmpty);
-            row->SetField(kInKovra.name, MetaBool::New(disk.inKovra), MetaStruct::_docEmpty);
-            row->SetField(kFormatVersion.name, MarshalVersion(disk.formatVersion),
+            row->SetField(kInKovra.Text(), MetaBool::New(disk.inKovra), MetaStruct::_docEmpty);
+            row->SetField(kFormatVersion.Text(), MarshalVersion(disk.formatVersion),
                           MetaStruct::_docEmpty);
-            row->SetField(kDeduplication.name, deduplication, MetaStruct::_docEmpty);
-            row->SetField(kCompression.name, deduplication, MetaStruct::_docEmpty);
-            row->SetField(kChecksum.name, MetaString::New(disk.checksum), MetaStruct::_docEmpty);
-            row->SetField(kChecksumOk.name, MetaBool::New(disk.checksumOk), MetaStruct::_docEmpty);
-            row->SetField(kIsCapacityTier.name, MetaBool::New(disk.isCapacityTier),
+            row->SetField(kDeduplication.Text(), deduplication, MetaStruct::_docEmpty);
+            row->SetField(kCompression.Text(), deduplication, MetaStruct::_docEmpty);
+            row->SetField(kChecksum.Text(), MetaString::New(disk.checksum), MetaStruct::_docEmpty);
+            row->SetField(kChecksumOk.Text(), MetaBool::New(disk.checksumOk),
                           MetaStruct::_docEmpty);
-            row->SetField(kEncryption.name, MetaBool::New(disk.encryption), MetaStruct::_docEmpty);
-            row->SetField(kDiskKeyLoaded.name, MetaBool::New(disk.diskKeyLoaded),
+            row->SetField(kIsCapacityTier.Text(), MetaBool::New(disk.isCapacityTier),
+                          MetaStruct::_docEmpty);
+            row->SetField(kEncryption.Text(), MetaBool::New(disk.encryption),
+                          MetaStruct::_docEmpty);
+            row->SetField(kDiskKeyLoaded.Text(), MetaBool::New(disk.diskKeyLoaded),
                           MetaStruct::_docEmpty);
             result->Add(row);
         }

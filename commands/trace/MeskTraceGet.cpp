@@ -30,11 +30,12 @@ using ZuvCtl::Mesk::MeskUtil;
 namespace {
 
 // The configuration's fields, in the order shown; ExecuteInternal fills them by these names.
-constexpr OutputField kDirectory{"MESK Traces Directory", META_STRING};
-constexpr OutputField kFilesToRotate{"Number Of Files To Rotate", META_INT};
-constexpr OutputField kMaxFileSize{"Maximum Trace File Size", META_INT};
-constexpr OutputField kLogUrgentToSyslog{"Log Urgent Traces To Syslog", META_BOOL};
-constexpr OutputField kFields[] = {kDirectory, kFilesToRotate, kMaxFileSize, kLogUrgentToSyslog};
+const OutputField kDirectory{"MESK Traces Directory", META_STRING};
+const OutputField kFilesToRotate{"Number Of Files To Rotate", META_INT};
+const OutputField kMaxFileSize{"Maximum Trace File Size", META_INT};
+const OutputField kLogUrgentToSyslog{"Log Urgent Traces To Syslog", META_BOOL};
+const OutputField* const kFields[] = {&kDirectory, &kFilesToRotate, &kMaxFileSize,
+                                      &kLogUrgentToSyslog};
 
 }  // namespace
 
@@ -94,10 +95,10 @@ void MeskTraceGet::ExecuteInternal(std::shared_ptr<Input> /*input*/,
 
     auto result = GetOutputStructure();
     const TraceSettings settings = ReadTraceSettings(file);
-    result->SetField(kDirectory.name, MetaString::New(settings.directory), MetaStruct::_docEmpty);
-    result->SetField(kFilesToRotate.name, MetaInt::New(settings.maxFiles), MetaStruct::_docEmpty);
-    result->SetField(kMaxFileSize.name, MetaInt::New(settings.fileSizeMb), MetaStruct::_docEmpty);
-    result->SetField(kLogUrgentToSyslog.name, MetaBool::New(settings.logUrgentToSyslog),
+    result->SetField(kDirectory.Text(), MetaString::New(settings.directory), MetaStruct::_docEmpty);
+    result->SetField(kFilesToRotate.Text(), MetaInt::New(settings.maxFiles), MetaStruct::_docEmpty);
+    result->SetField(kMaxFileSize.Text(), MetaInt::New(settings.fileSizeMb), MetaStruct::_docEmpty);
+    result->SetField(kLogUrgentToSyslog.Text(), MetaBool::New(settings.logUrgentToSyslog),
                      MetaStruct::_docEmpty);
     file.close();
     output->SetRootObject(result);
