@@ -1,5 +1,7 @@
 // The "simple" formatter: titled blocks of "Field: value" lines. Every text is shown through
 // ScreenText: host data never reaches the terminal raw.
+#include <cstring>
+
 #include "Formatter.h"
 #include "Text.h"
 
@@ -64,6 +66,9 @@ class SimpleWriter {
   private:
     void Fields(const MetaStruct& structure, const OutputLayout::Selection& selection,
                 const Lines& lines, size_t fieldIndent) {
+        if (PlainFields(structure, selection, lines)) {
+            return;
+        }
         for (size_t shown = 0; shown < selection.fields.size(); ++shown) {
             const MetaObject* value = structure.FieldAt(selection.fields[shown]).value.get();
             text_ += lines.heads[shown];
@@ -89,7 +94,67 @@ class SimpleWriter {
         }
     }
 
-  private:
+    // Fields() for the common structure whose shown values are all printable ASCII texts and
+    // booleans, which need no escape: the room for all its lines is made at once and they
+    // are copied in. Returns false, having written nothing, for any other structure.
+    bool PlainFields(const MetaStruct& structure, const OutputLayout::Selection& selection,
+                     const Lines& lines) {
+        const size_t count = selection.fields.size();
+        values_.clear();
+        size_t room = 0;
+        for (size_t shown = 0; shown < count; ++shown) {
+            const MetaObject* value = structure.FieldAt(selection.fields[shown]).value.get();
+            if (value == nullptr) {
+                return false;
+            }
+            const MetaObj::MetaType type = value->GetType();
+            if (type == MetaObj::META_STRING) {
+                const std::string& text =
+                    static_cast<const MetaObj::MetaString&>(*value).GetValue();
+                if (!IsPlainText(text)) {
+                    return false;
+                }
+                room += text.size();
+            } else if (type != MetaObj::META_BOOL) {
+                return false;
+            }
+            values_.push_back(value);
+            room += lines.heads[shown].size() + lines.units[shown].size() + 7;
+        }
+        const size_t start = text_.size();
+        text_.resize(start + room);
+        char* out = &text_[start];
+        const auto put = [&out](const char* data, size_t size) {
+            std::memcpy(out, data, size);
+            out += size;
+        };
+        for (size_t shown = 0; shown < count; ++shown) {
+            put(lines.heads[shown].data(), lines.heads[shown].size());
+            const MetaObject* value = values_[shown];
+            const char* data = "";
+            size_t size = 0;
+            if (value->GetType() == MetaObj::META_STRING) {
+                const std::string& text =
+                    static_cast<const MetaObj::MetaString&>(*value).GetValue();
+                data = text.data();
+                size = text.size();
+            } else if (static_cast<const MetaObj::MetaBool&>(*value).HasValue()) {
+                const bool flag = static_cast<const MetaObj::MetaBool&>(*value).GetValue();
+                data = flag ? "true" : "false";
+                size = flag ? 4 : 5;
+            }
+            // No value: "Name:" alone, and no unit.
+            if (size != 0) {
+                *out++ = ' ';
+                put(data, size);
+                put(lines.units[shown].data(), lines.units[shown].size());
+            }
+            *out++ = '\n';
+        }
+        text_.resize(static_cast<size_t>(out - text_.data()));
+        return true;
+    }
+
     // A structure or list of structures held in a field: its blocks, one level further in.
     void Nested(const MetaObject& value, size_t indent) {
         if (value.GetType() == MetaObj::META_STRUCT) {
@@ -127,6 +192,7 @@ class SimpleWriter {
     std::string& text_;
     const OutputLayout& layout_;
     Lines lines_[2];
+    std::vector<const MetaObject*> values_;  // PlainFields' values, in display order
 };
 
 }  // namespace

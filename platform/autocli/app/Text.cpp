@@ -5,6 +5,8 @@
 #include <wchar.h>
 
 #include <algorithm>
+#include <cstdint>
+#include <cstring>
 
 namespace Kalmor {
 namespace AutoCli {
@@ -232,13 +234,27 @@ std::string MessageText(const std::string& text) {
 }
 
 bool IsPlainText(const std::string& text) {
-    // No early exit: the loop runs over whole vectors of bytes.
-    bool plain = true;
-    for (char c : text) {
-        const auto byte = static_cast<unsigned char>(c);
-        plain &= byte >= 0x20 && byte < 0x7F;
+    // Eight bytes at a time: whether any is below 0x20 or above 0x7E.
+    constexpr uint64_t kOnes = 0x0101010101010101;
+    constexpr uint64_t kHighBits = 0x8080808080808080;
+    const char* data = text.data();
+    size_t size = text.size();
+    for (; size >= 8; data += 8, size -= 8) {
+        uint64_t word;
+        std::memcpy(&word, data, 8);
+        const uint64_t below = (word - kOnes * 0x20) & ~word;
+        const uint64_t above = (word + kOnes * (127 - 0x7E)) | word;
+        if (((below | above) & kHighBits) != 0) {
+            return false;
+        }
     }
-    return plain;
+    for (; size > 0; ++data, --size) {
+        const auto byte = static_cast<unsigned char>(*data);
+        if (byte < 0x20 || byte > 0x7E) {
+            return false;
+        }
+    }
+    return true;
 }
 
 void AppendScreenText(std::string& out, const std::string& text) {

@@ -177,6 +177,8 @@ TEST(TableFormatter, PadsByDisplayWidthAndShowsControlsEscaped) {
         {"\x1b]0;t\x07", 6, "\\x1b]0;t\\x07"},     // C0 from the host
         {"a\tb\r\n\x7f", 6, "a\\tb\\r\\n\\x7f"},   // tab, line ends, DEL
         {"\xC2\x9B+\x9B+", 4, "\\u009b+\\x9b+"},   // C1, and as a stray byte
+        {"abc\177defgh", 9, "abc\\x7fdefgh"},      // within eight bytes read at once
+        {"ab\001cdefgh", 9, "ab\\x01cdefgh"},
     };
     auto rows = MetaList::New(META_STRUCT);
     for (const auto& entry : cases) {
