@@ -1,9 +1,12 @@
 // The "json" and "json-pretty" formatters.
 #include <algorithm>
+#include <charconv>
+#include <cstring>
 
 #include <nlohmann/json.hpp>
 
 #include "Formatter.h"
+#include "Text.h"
 
 namespace Kalmor {
 namespace AutoCli {
@@ -131,6 +134,9 @@ class JsonWriter {
             out_ += "{}";
             return;
         }
+        if (PlainStruct(structure, fields != nullptr ? &shown : nullptr, depth)) {
+            return;
+        }
         out_ += '{';
         for (size_t i = 0; i < count; ++i) {
             if (i != 0) {
@@ -144,6 +150,98 @@ class JsonWriter {
         }
         Indent(depth);
         out_ += '}';
+    }
+
+    // Struct() for the common structure whose values are all texts of printable ASCII without
+    // quotation marks or backslashes, integers, booleans and empty values: the room for it is
+    // made at once and it is copied in, each name as written for the last structure with the
+    // same fields. Returns false, having written nothing, for any other structure.
+    bool PlainStruct(const MetaObj::MetaStruct& structure, const std::vector<size_t>* shown,
+                     size_t depth) {
+        const size_t count = shown != nullptr ? shown->size() : structure.FieldCount();
+        const auto indexOf = [&](size_t i) { return shown != nullptr ? (*shown)[i] : i; };
+        if (keys_.model == nullptr || keys_.depth != depth ||
+            keys_.selected != (shown != nullptr) || (shown != nullptr && keys_.shown != *shown) ||
+            !structure.HasFieldsOf(*keys_.model)) {
+            keys_.model = &structure;
+            keys_.depth = depth;
+            keys_.selected = shown != nullptr;
+            keys_.shown = shown != nullptr ? *shown : std::vector<size_t>();
+            keys_.texts.clear();
+            for (size_t i = 0; i < count; ++i) {
+                std::string key = i != 0 ? "," : "";
+                JsonWriter(key, pretty_).Indent(depth + 1);
+                JsonWriter(key, pretty_).String(structure.FieldAt(indexOf(i)).name);
+                key += pretty_ ? ": " : ":";
+                keys_.texts.push_back(std::move(key));
+            }
+        }
+        size_t room = 2 + 2 * depth + 1;
+        for (size_t i = 0; i < count; ++i) {
+            const MetaObject* value = structure.FieldAt(indexOf(i)).value.get();
+            room += keys_.texts[i].size() + 22;
+            if (value == nullptr || value->GetType() != MetaObj::META_STRING) {
+                if (value != nullptr && value->GetType() != MetaObj::META_BOOL &&
+                    value->GetType() != MetaObj::META_INT) {
+                    return false;
+                }
+                continue;
+            }
+            const std::string& text = static_cast<const MetaObj::MetaString&>(*value).GetValue();
+            if (!IsPlainText(text) || std::memchr(text.data(), '"', text.size()) != nullptr ||
+                std::memchr(text.data(), '\\', text.size()) != nullptr) {
+                return false;
+            }
+            room += text.size();
+        }
+        const size_t start = out_.size();
+        out_.resize(start + room);
+        char* out = &out_[start];
+        const auto put = [&out](const char* data, size_t size) {
+            std::memcpy(out, data, size);
+            out += size;
+        };
+        *out++ = '{';
+        for (size_t i = 0; i < count; ++i) {
+            put(keys_.texts[i].data(), keys_.texts[i].size());
+            const MetaObject* value = structure.FieldAt(indexOf(i)).value.get();
+            if (value == nullptr) {
+                put("null", 4);
+            } else if (value->GetType() == MetaObj::META_STRING) {
+                const auto& scalar = static_cast<const MetaObj::MetaString&>(*value);
+                if (scalar.HasValue()) {
+                    *out++ = '"';
+                    put(scalar.GetValue().data(), scalar.GetValue().size());
+                    *out++ = '"';
+                } else {
+                    put("null", 4);
+                }
+            } else if (value->GetType() == MetaObj::META_BOOL) {
+                const auto& scalar = static_cast<const MetaObj::MetaBool&>(*value);
+                if (!scalar.HasValue()) {
+                    put("null", 4);
+                } else if (scalar.GetValue()) {
+                    put("true", 4);
+                } else {
+                    put("false", 5);
+                }
+            } else {
+                const auto& scalar = static_cast<const MetaObj::MetaInt&>(*value);
+                if (scalar.HasValue()) {
+                    out = std::to_chars(out, out + 20, scalar.GetValue()).ptr;
+                } else {
+                    put("null", 4);
+                }
+            }
+        }
+        if (pretty_) {
+            *out++ = '\n';
+            std::memset(out, ' ', 2 * depth);
+            out += 2 * depth;
+        }
+        *out++ = '}';
+        out_.resize(static_cast<size_t>(out - out_.data()));
+        return true;
     }
 
     void List(const MetaObj::MetaList& list, const std::vector<std::string>* fields, size_t depth) {
@@ -174,12 +272,8 @@ class JsonWriter {
     void String(const std::string& text) {
         // Printable ASCII without quotation marks or backslashes, most texts, is written as
         // it is; anything else is escaped by the JSON library.
-        bool plain = true;
-        for (char c : text) {
-            const auto byte = static_cast<unsigned char>(c);
-            plain &= byte >= 0x20 && byte < 0x7F && byte != '"' && byte != '\\';
-        }
-        if (!plain) {
+        if (!IsPlainText(text) || std::memchr(text.data(), '"', text.size()) != nullptr ||
+            std::memchr(text.data(), '\\', text.size()) != nullptr) {
             out_ += nlohmann::ordered_json(text).dump(-1, ' ', false,
                                                       nlohmann::json::error_handler_t::replace);
             return;
@@ -198,6 +292,15 @@ class JsonWriter {
 
     std::string& out_;
     bool pretty_;
+    // The members' names as PlainStruct writes them, with what stands before each, and the
+    // structure, depth and selection they were made for.
+    struct Keys {
+        const MetaObj::MetaStruct* model = nullptr;
+        size_t depth = 0;
+        bool selected = false;
+        std::vector<size_t> shown;
+        std::vector<std::string> texts;
+    } keys_;
 };
 
 std::string Dump(const MetaObject& root, const FormatOptions& options, bool pretty) {
