@@ -55,6 +55,14 @@ set(CPACK_DEBIAN_FILE_NAME DEB-DEFAULT)
 set(CPACK_DEBIAN_PACKAGE_SECTION admin)
 set(CPACK_DEBIAN_PACKAGE_PRIORITY optional)
 set(CPACK_DEBIAN_PACKAGE_SHLIBDEPS ON)
+# autocli and hostsim name their platform library as $ORIGIN/../lib/<triplet>/mesk/lib....so.0
+# (see mesk_link_by_path), which dpkg-shlibdeps takes literally, as a path below each directory
+# it searches. Below this one, "$ORIGIN" leads to the programs' directory of the build tree,
+# which is laid out as the installed tree, so that it finds the libraries there.
+set(mesk_shlibdeps_dir ${CMAKE_BINARY_DIR}/packaging/shlibdeps)
+file(MAKE_DIRECTORY ${mesk_shlibdeps_dir})
+file(CREATE_LINK ${CMAKE_BINARY_DIR}/platform/autocli "${mesk_shlibdeps_dir}/$ORIGIN" SYMBOLIC)
+set(CPACK_DEBIAN_PACKAGE_SHLIBDEPS_PRIVATE_DIRS ${mesk_shlibdeps_dir})
 set(CPACK_DEBIAN_PACKAGE_RECOMMENDS bash-completion)
 set(CPACK_DEBIAN_DEBUGINFO_PACKAGE ON)
 set(CPACK_DEBIAN_PACKAGE_CONTROL_EXTRA ${CMAKE_CURRENT_LIST_DIR}/postrm)

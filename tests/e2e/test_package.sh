@@ -68,6 +68,16 @@ expect_eq "$(grep -c "$MESK_BUILD_DIR" "$E2E_DIR/trace")" 0 "build-tree paths th
 expect_eq "$(grep -q "$INSTALLED/.*/autocli/plugins/libmesk.so\"" "$E2E_DIR/trace" && echo yes)" yes \
     "the installed plug-in opened"
 
+case_ "the installed programs open their own libraries at the first try"
+# No plug-in: the plug-in's own lookup of the host-control library is its business.
+mkdir -p "$E2E_DIR/no-plugins"
+for program in autocli hostsim; do
+    AUTOCLI_PLUGIN_PATH="$E2E_DIR/no-plugins" strace -f -e trace=openat,open,stat,newfstatat \
+        -o "$E2E_DIR/trace" "$INSTALLED/bin/$program" --version >/dev/null 2>&1
+    expect_eq "$(grep ENOENT "$E2E_DIR/trace" | grep -c "$INSTALLED")" 0 \
+        "failed lookups below the installed tree by $program"
+done
+
 # The installed programs use /var/lib/hostsim: in a mount namespace of their own, that is the
 # throwaway root's. Without the right to make one, the remaining cases are skipped.
 in_sysroot() {
