@@ -47,6 +47,27 @@ expect_err_has "Mesk Clustering is not enabled on this host"
 _capture bash -c "$FIRST"
 expect_err "Mesk Clustering is not enabled on this host"
 
+case_ "a source edited since the last build is rebuilt before the command runs"
+# A line on stderr from every load of the plug-in, then the source as it was.
+SOURCE=registry/RegisterNamespaces.cpp
+cp "$SOURCE" "$E2E_DIR/source"
+printf '%s\n' '#include <cstdio>' \
+    '[[maybe_unused]] static const int kEdited = std::fputs("edited\n", stderr);' >>"$SOURCE"
+_capture bash -c "$FIRST"
+expect_rc 1
+expect_err_has "mesk: building ["
+expect_err_has "edited"
+cp "$E2E_DIR/source" "$SOURCE"
+_capture bash -c "$FIRST"
+expect_err_has "mesk: building ["
+expect_eq "$(grep -c '^edited$' <<<"$ERR")" 0 "lines from the edit after it was undone"
+
+case_ "./hostsim works on the host of ./autocli, .hostsim/ in the checkout"
+_capture ./hostsim calls
+expect_rc 0
+expect_out_has '"op":"GetClusterConfig"'
+expect_eq "$([ -f .hostsim/state.db ] && echo present)" present ".hostsim/state.db"
+
 case_ "an install with something unbuilt copies nothing"
 rm build/platform/autocli/completions/bash/autocli
 _capture cmake --install build --prefix "$E2E_DIR/partial"
