@@ -3,8 +3,9 @@
 // wrappers run; never into the installed programs. Before main, it makes sure that the build
 // is current: when a source listed in build/.tools-watch changed since build/.tools-built was
 // taken, scripts/ensure-built brings build/ up to date and the new build of the program starts
-// in this process's place. Then it points the simulated host at .hostsim/ in the checkout,
-// unless HOSTSIM_STATE and MESK_HOST_ROOT say otherwise.
+// in this process's place. Then it makes the directories of the simulated host that the
+// wrapper named (HOSTSIM_STATE and MESK_HOST_ROOT: the wrapper sets them, since the
+// host-control library's constructor, which runs before this one, sets a default of its own).
 #include <fcntl.h>
 #include <sys/stat.h>
 #include <sys/wait.h>
@@ -72,16 +73,6 @@ int EnsureBuilt() {
     return WIFEXITED(status) ? WEXITSTATUS(status) : 1;
 }
 
-// `name` as it is when set and not empty, else `fallback`; exported either way.
-std::string Default(const char* name, const char* fallback) {
-    const char* value = std::getenv(name);
-    if (value == nullptr || *value == '\0') {
-        setenv(name, fallback, 1);
-        return fallback;
-    }
-    return value;
-}
-
 // Makes the directory and whatever it lacks of its parents; failures show when the host is
 // opened.
 void MakeDirectories(const std::string& path) {
@@ -114,11 +105,14 @@ __attribute__((constructor(101))) void RunCurrentBuild(int, char** argv, char**)
         _exit(127);
     }
 
-    const std::string state = Default("HOSTSIM_STATE", MESK_CHECKOUT_ROOT "/.hostsim/state.db");
-    const std::string hostRoot = Default("MESK_HOST_ROOT", MESK_CHECKOUT_ROOT "/.hostsim/root");
-    const size_t slash = state.rfind('/');
-    if (slash != std::string::npos && slash > 0) MakeDirectories(state.substr(0, slash));
-    MakeDirectories(hostRoot);
+    const char* state = std::getenv("HOSTSIM_STATE");
+    const char* hostRoot = std::getenv("MESK_HOST_ROOT");
+    if (state != nullptr && *state != '\0') {
+        const std::string path = state;
+        const size_t slash = path.rfind('/');
+        if (slash != std::string::npos && slash > 0) MakeDirectories(path.substr(0, slash));
+    }
+    if (hostRoot != nullptr && *hostRoot != '\0') MakeDirectories(hostRoot);
 }
 
 }  // namespace

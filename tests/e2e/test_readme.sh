@@ -67,6 +67,11 @@ _capture ./hostsim calls
 expect_rc 0
 expect_out_has '"op":"GetClusterConfig"'
 expect_eq "$([ -f .hostsim/state.db ] && echo present)" present ".hostsim/state.db"
+CONF=.hostsim/root/etc/orvane/mesk/mesktraced.conf
+rm -f "$CONF"
+_capture ./hostsim reset
+expect_rc 0
+expect_eq "$([ -f "$CONF" ] && echo present)" present "the host's files made again by ./hostsim reset"
 
 case_ "an install with something unbuilt copies nothing"
 rm build/platform/autocli/completions/bash/autocli
