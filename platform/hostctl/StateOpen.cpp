@@ -6,8 +6,8 @@
 #include <unistd.h>
 
 #include <cerrno>
-#include <cstring>
 #include <cstdio>
+#include <cstring>
 #include <optional>
 #include <type_traits>
 
@@ -146,6 +146,7 @@ StateStore::Kind StateStore::Inspect() {
         throw MeskCtlException("Simulated host state " + path_ + " is not a file");
     }
     if (file.st_size == 0) return Kind::kMissing;
+    bool marked = false;  // the file's header bears our application id
     {
         // The database header's marks are read before SQLite sees the file: opening another
         // program's database in WAL mode would leave a log and an index beside it.
@@ -163,7 +164,8 @@ StateStore::Kind StateStore::Inspect() {
                    header[offset + 2] << 8 | header[offset + 3];
         };
         // Only the first hostsim's hosts have no application id; their version is 1.
-        if (mark(68) != kApplicationId && (mark(68) != 0 || mark(60) != 1)) {
+        marked = mark(68) == kApplicationId;
+        if (!marked && (mark(68) != 0 || mark(60) != 1)) {
             throw MeskCtlException("Simulated host state " + path_ +
                                    " is another program's SQLite database, not a simulated host");
         }
@@ -172,8 +174,11 @@ StateStore::Kind StateStore::Inspect() {
     // The read transaction that begins here is the one every later read of this process
     // answers from, until it changes something.
     BeginRead();
-    int64_t applicationId = QueryNumber("PRAGMA application_id");
+    // The header above is the file's; the log may hold a newer one. Of the marks, only the
+    // version changes in place (a newer hostsim replacing the tables), and the application id
+    // only from none (the first layout's) to ours, so an id found in the file stands.
     int64_t version = QueryNumber("PRAGMA user_version");
+    int64_t applicationId = marked ? kApplicationId : QueryNumber("PRAGMA application_id");
     bool firstLayout =
         applicationId == 0 && version == 1 &&
         QueryNumber("SELECT count(*) FROM sqlite_master WHERE type = 'table' AND name = 'section'");

@@ -2,6 +2,8 @@
 // has read. StateOpen.cpp opens the database.
 #include "StateStore.h"
 
+#include <algorithm>
+#include <cstdlib>
 #include <stdexcept>
 
 #include "hostctl/MeskCtlException.h"
@@ -84,6 +86,11 @@ void BindDisk(sqlite3_stmt* statement, int first, const Disk& disk) {
     });
 }
 
+// The order in which failures are consulted: by operation, then every call (0) before the Nth.
+bool FaultOrder(const Fault& a, const Fault& b) {
+    return a.op != b.op ? a.op < b.op : a.call < b.call;
+}
+
 // Resets a prepared statement when the scope ends, whatever way it ends.
 class Use {
   public:
@@ -127,20 +134,22 @@ int64_t StateStore::QueryNumber(const char* sql) {
 }
 
 sqlite3_stmt* StateStore::Statement(const char* sql) {
-    auto it = statements_.find(sql);
-    if (it != statements_.end()) return it->second;
+    for (const auto& entry : statements_) {
+        if (entry.first == sql) return entry.second;
+    }
     sqlite3_stmt* statement = nullptr;
     if (sqlite3_prepare_v3(db_, sql, -1, SQLITE_PREPARE_PERSISTENT, &statement, nullptr) !=
         SQLITE_OK) {
         Fail("cannot prepare a query");
     }
-    statements_[sql] = statement;
+    statements_.emplace_back(sql, statement);
     return statement;
 }
 
 void StateStore::Forget() {
-    noFaults_ = false;
+    sectionsLoaded_ = false;
     sections_.clear();
+    faults_.clear();
     disksLoaded_ = false;
     disks_.clear();
     byUuid_.Clear();
@@ -193,34 +202,75 @@ void StateStore::Transaction::Commit() {
     done_ = true;
 }
 
-const Json& StateStore::ReadSection(const std::string& name) {
-    auto cached = sections_.find(name);
-    if (cached != sections_.end()) return cached->second;
+void StateStore::LoadSections() {
+    if (sectionsLoaded_) return;
     BeginRead();
-    Use query(Statement("SELECT value FROM section WHERE name = ?1"));
-    Bind(query, 1, name);
-    if (sqlite3_step(query) != SQLITE_ROW) Fail("no section " + name);
-    std::string text;
-    Read(query, 0, text);
-    return sections_[name] = Json::parse(text);
+    // A fault's row has its call in the third column, a section's has none.
+    Use query(Statement(
+        "SELECT name, value, NULL FROM section UNION ALL SELECT op, message, call FROM fault"));
+    sections_.clear();
+    faults_.clear();
+    int step;
+    while ((step = sqlite3_step(query)) == SQLITE_ROW) {
+        if (sqlite3_column_type(query, 2) == SQLITE_NULL) {
+            Section& section = sections_.emplace_back();
+            Read(query, 0, section.name);
+            Read(query, 1, section.text);
+        } else {
+            Fault& fault = faults_.emplace_back();
+            Read(query, 0, fault.op);
+            Read(query, 1, fault.message);
+            Read(query, 2, fault.call);
+        }
+    }
+    if (step != SQLITE_DONE) Fail("cannot read");
+    std::sort(faults_.begin(), faults_.end(), FaultOrder);
+    sectionsLoaded_ = true;
 }
 
-Json StateStore::ReadExtra(const std::string& name) {
-    BeginRead();
-    Use query(Statement("SELECT value FROM section WHERE name = ?1"));
-    Bind(query, 1, name);
-    if (sqlite3_step(query) != SQLITE_ROW) return Json();
-    std::string text;
-    Read(query, 0, text);
-    return Json::parse(text, nullptr, false);
+StateStore::Section* StateStore::FindSection(std::string_view name) {
+    LoadSections();
+    for (Section& section : sections_) {
+        if (section.name == name) return &section;
+    }
+    return nullptr;
 }
 
-void StateStore::WriteSection(const std::string& name, const Json& value) {
+const Json& StateStore::ReadSection(std::string_view name) {
+    Section* section = FindSection(name);
+    if (section == nullptr) Fail("no section " + std::string(name));
+    if (!section->value) {
+        section->value = std::make_unique<Json>(Json::parse(section->text));
+        std::string().swap(section->text);
+    }
+    return *section->value;
+}
+
+Json StateStore::ReadExtra(std::string_view name) {
+    Section* section = FindSection(name);
+    if (section == nullptr) return Json();
+    if (section->value) return *section->value;
+    return Json::parse(section->text, nullptr, false);
+}
+
+void StateStore::WriteSection(std::string_view name, const Json& value) {
     Use statement(Statement("INSERT OR REPLACE INTO section(name, value) VALUES(?1, ?2)"));
-    Bind(statement, 1, name);
+    sqlite3_bind_text(statement, 1, name.data(), static_cast<int>(name.size()), SQLITE_STATIC);
     Bind(statement, 2, JsonText(value));
-    if (sqlite3_step(statement) != SQLITE_DONE) Fail("cannot write " + name);
-    sections_[name] = value;
+    if (sqlite3_step(statement) != SQLITE_DONE) Fail("cannot write " + std::string(name));
+    // Until the sections are read, the next read finds the row written.
+    if (!sectionsLoaded_) return;
+    Section* section = FindSection(name);
+    if (section == nullptr) {
+        section = &sections_.emplace_back();
+        section->name = name;
+    }
+    section->text.clear();
+    if (section->value) {
+        *section->value = value;
+    } else {
+        section->value = std::make_unique<Json>(value);
+    }
 }
 
 void StateStore::LoadDisks() {
@@ -337,50 +387,45 @@ void StateStore::Replace(const Json& host) {
 }
 
 int64_t StateStore::DocumentVersion() {
-    BeginRead();
-    // Whether any failure is injected comes with it: every invocation asks both when it opens
-    // the state, and a statement fewer to prepare is a good part of what a short command costs.
-    static const std::string select =
-        std::string("SELECT coalesce((SELECT CAST(value AS INTEGER) FROM section WHERE name = '") +
-        kVersionSection + "'), 1), EXISTS (SELECT 1 FROM fault)";
-    Use query(Statement(select.c_str()));
-    if (sqlite3_step(query) != SQLITE_ROW) Fail("cannot read");
-    noFaults_ = sqlite3_column_int(query, 1) == 0;
-    return sqlite3_column_int64(query, 0);
+    // A number's text, as written; a state of version 1 has none.
+    Section* section = FindSection(kVersionSection);
+    if (section == nullptr) return 1;
+    if (section->value) return section->value->is_number() ? section->value->get<int64_t>() : 0;
+    return std::strtoll(section->text.c_str(), nullptr, 10);
 }
 
 std::vector<Fault> StateStore::ReadFaults() {
-    BeginRead();
-    if (noFaults_) return {};
-    Use query(Statement("SELECT op, call, message FROM fault ORDER BY op, call"));
-    std::vector<Fault> faults;
-    while (sqlite3_step(query) == SQLITE_ROW) {
-        Fault fault;
-        Read(query, 0, fault.op);
-        Read(query, 1, fault.call);
-        Read(query, 2, fault.message);
-        faults.push_back(std::move(fault));
-    }
-    return faults;
+    LoadSections();
+    return faults_;
 }
 
 void StateStore::SetFault(const Fault& fault) {
-    noFaults_ = false;
     Use statement(Statement("INSERT OR REPLACE INTO fault(op, call, message) VALUES(?1, ?2, ?3)"));
     Bind(statement, 1, fault.op);
     Bind(statement, 2, fault.call);
     Bind(statement, 3, fault.message);
     if (sqlite3_step(statement) != SQLITE_DONE) Fail("cannot write a failure");
+    if (!sectionsLoaded_) return;
+    auto at = std::lower_bound(faults_.begin(), faults_.end(), fault, FaultOrder);
+    if (at != faults_.end() && at->op == fault.op && at->call == fault.call) {
+        at->message = fault.message;
+    } else {
+        faults_.insert(at, fault);
+    }
 }
 
 void StateStore::ClearFaults(const std::string& op) {
     if (op.empty()) {
         Exec("DELETE FROM fault");
+        faults_.clear();
         return;
     }
     Use statement(Statement("DELETE FROM fault WHERE op = ?1"));
     Bind(statement, 1, op);
     if (sqlite3_step(statement) != SQLITE_DONE) Fail("cannot clear a failure");
+    faults_.erase(std::remove_if(faults_.begin(), faults_.end(),
+                                 [&](const Fault& fault) { return fault.op == op; }),
+                  faults_.end());
 }
 
 }  // namespace HostCtlSim

@@ -9,6 +9,9 @@
 // A process that only reads opens the database read-only and writes nothing: the first read
 // begins one read transaction, which lasts until the process changes something or ends, and
 // everything it reads is kept, so that all reads of an invocation agree and each is read once.
+// The first read takes every section and every injected failure in one statement, since each
+// statement prepared costs a short command more than reading the few rows does; a section's
+// JSON text is parsed when it is first asked for.
 // Every change is one BEGIN IMMEDIATE transaction on a read-write connection, so that
 // concurrent processes queue up behind a busy timeout and a killed process leaves the state as
 // it was before or after the change; reads after a change see it.
@@ -18,9 +21,10 @@
 
 #include <cstdint>
 #include <functional>
-#include <map>
+#include <memory>
 #include <string>
 #include <string_view>
+#include <utility>
 #include <vector>
 
 #include "StateDocument.h"
@@ -71,9 +75,9 @@ class StateStore {
     // Reading. References stay valid until the next change of the same item or the end of the
     // transaction.
     // One top-level key of the document (not "storage.disks" nor "services").
-    const Json& ReadSection(const std::string& name);
+    const Json& ReadSection(std::string_view name);
     // A row of the section table that is not part of the document, or null when there is none.
-    Json ReadExtra(const std::string& name);
+    Json ReadExtra(std::string_view name);
     // Every disk, in inventory order.
     const std::vector<Disk>& Disks();
     // The disk with that UUID (lower case), or nullptr.
@@ -85,8 +89,8 @@ class StateStore {
     std::vector<Fault> ReadFaults();
 
     // Changing, within a Transaction.
-    void WriteSection(const std::string& name, const Json& value);  // also an extra row
-    void WriteDisk(const Disk& disk);                               // the disk of that UUID
+    void WriteSection(std::string_view name, const Json& value);  // also an extra row
+    void WriteDisk(const Disk& disk);                             // the disk of that UUID
     void DeleteDisk(const std::string& uuid);
     void Replace(const Json& host);  // by a normalized document
     void SetFault(const Fault& fault);
@@ -106,6 +110,7 @@ class StateStore {
     void BeginWrite();
     void EndTransaction(const char* sql);
     void Forget();
+    void LoadSections();
     void LoadDisks();
     // An index of disks_ by one text field: open addressing over their positions, so that
     // indexing thousands of disks allocates once.
@@ -133,11 +138,20 @@ class StateStore {
     bool writable_ = false;
     enum class TransactionKind { kNone, kReading, kWriting };
     TransactionKind transaction_ = TransactionKind::kNone;
-    std::map<const char*, sqlite3_stmt*> statements_;
+    // Prepared statements by their text's address: a handful, searched in order.
+    std::vector<std::pair<const char*, sqlite3_stmt*>> statements_;
 
     // What the current transaction has read.
-    bool noFaults_ = false;  // known to have no injected failure
-    std::map<std::string, Json> sections_;
+    struct Section {
+        std::string name;
+        std::string text;             // as read; empty once parsed or written
+        std::unique_ptr<Json> value;  // parsed on first use; its own allocation, so that
+                                      // references to it outlive a section added later
+    };
+    Section* FindSection(std::string_view name);
+    bool sectionsLoaded_ = false;  // sections_ and faults_ hold every row
+    std::vector<Section> sections_;
+    std::vector<Fault> faults_;
     bool disksLoaded_ = false;
     std::vector<Disk> disks_;
     // Indexes of disks_, by UUID and, of the disks with a device, by name.
