@@ -74,14 +74,26 @@ SimHost::Options SimHost::OptionsFromEnvironment() {
 }
 
 SimHost& SimHost::Default() {
-    static SimHost host(OptionsFromEnvironment());
-    return host;
+    // Never destroyed: freeing all it read would only cost the process's end time. An exit
+    // handler writes the call log and closes the state only where this process changed it.
+    static SimHost* const host = new SimHost(OptionsFromEnvironment());
+    static const bool ending = std::atexit([] { host->EndProcess(); }) == 0;
+    (void)ending;
+    return *host;
 }
 
 SimHost::SimHost(Options options) : options_(std::move(options)), root_(options_.hostRoot) {}
 
 SimHost::~SimHost() {
     log_.Write(root_);
+}
+
+void SimHost::EndProcess() {
+    log_.Write(root_);
+    // A writer closes, so that the last one to close copies the log back into the database.
+    // A reader's connection is left to the end of the process, which releases its locks: it
+    // wrote nothing and has nothing to undo.
+    if (store_ && store_->IsWritable()) store_.reset();
 }
 
 StateStore& SimHost::Store() {

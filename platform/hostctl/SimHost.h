@@ -35,7 +35,8 @@ class SimHost : public HostBackend {
     // HOSTSIM_STATE (default /var/lib/hostsim/state.db) and MESK_HOST_ROOT (default
     // /var/lib/hostsim/root; programs run at their own paths when it is unset).
     static Options OptionsFromEnvironment();
-    // The process's simulated host, made on first use from the environment.
+    // The process's simulated host, made on first use from the environment. It lasts until
+    // the process ends, which writes its call log.
     static SimHost& Default();
 
     explicit SimHost(Options options);
@@ -73,6 +74,10 @@ class SimHost : public HostBackend {
     void NoteRemoved(const std::string& name) { removedInterfaces_.insert(name); }
 
   private:
+    // The end of the process that made Default(): writes the call log and closes the state
+    // if this process changed it.
+    void EndProcess();
+
     Options options_;
     HostRoot root_;
     std::unique_ptr<StateStore> store_;

@@ -57,6 +57,9 @@ class StateStore {
     // Like Open, but a host made by an older hostsim is emptied, to be replaced whole.
     bool OpenForReplacement(const std::function<void()>& makeFiles = {});
     const std::string& Path() const { return path_; }
+    // Whether the connection open is a read-write one, as it is from this process's first
+    // change on.
+    bool IsWritable() const { return writable_; }
 
     // A change: BEGIN IMMEDIATE on a read-write connection, rolled back unless committed.
     // Reads within it see the state as it is now. Throws MeskCtlException ("cannot change the
