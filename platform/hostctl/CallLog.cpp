@@ -10,6 +10,7 @@
 #include <charconv>
 #include <cstring>
 #include <ctime>
+#include <iterator>
 #include <stdexcept>
 
 namespace HostCtlSim {
@@ -74,6 +75,14 @@ char* Copy(char* out, const char (&text)[N]) {
     return out + N - 1;
 }
 
+// Writes `text`, which needs no escaping, as a JSON string; returns the end.
+char* Quote(char* out, const char* text, size_t size) {
+    out[0] = '"';
+    std::memcpy(out + 1, text, size);
+    out[size + 1] = '"';
+    return out + size + 2;
+}
+
 }  // namespace
 
 // The JSON text of what is not plain, made by nlohmann's own serializer (the one that dump()
@@ -95,7 +104,7 @@ class CallLog::Writer {
     nlohmann::detail::serializer<Json> serializer_;
 };
 
-CallLog::CallLog() : writer_(std::make_unique<Writer>()) {}
+CallLog::CallLog() = default;
 CallLog::~CallLog() = default;
 
 char* CallLog::Room(size_t bytes) {
@@ -122,13 +131,13 @@ char* CallLog::AppendTime(char* out) {
     // to the next and whose text is kept, then the nanoseconds in nine digits.
     timespec now{};
     clock_gettime(CLOCK_REALTIME, &now);
-    if (now.tv_sec != second_ || secondText_[0] == '\0') {
+    if (now.tv_sec != second_) {
         second_ = now.tv_sec;
-        *std::to_chars(secondText_, secondText_ + sizeof secondText_ - 1, second_).ptr = '\0';
+        secondLength_ =
+            size_t(std::to_chars(secondText_, std::end(secondText_), second_).ptr - secondText_);
     }
-    size_t length = std::strlen(secondText_);
-    std::memcpy(out, secondText_, length);
-    out += length;
+    std::memcpy(out, secondText_, secondLength_);
+    out += secondLength_;
     static const char kPairs[] =
         "00010203040506070809101112131415161718192021222324252627282930313233343536373839"
         "40414243444546474849505152535455565758596061626364656667686970717273747576777879"
@@ -147,8 +156,32 @@ void CallLog::Record(Operation op, CallArgs args) {
     // names are plain identifiers and need no escaping.
     const char* name = OperationName(op);
     size_t nameLength = std::strlen(name);
+    // The calls made by the thousand have plain texts, flags and numbers for arguments: room
+    // for their whole line is made at once, and they are written straight into it.
+    size_t bound = 64 + nameLength + 1;
+    bool simple = true;
+    for (const CallArg& arg : args) {
+        switch (arg.kind_) {
+            case CallArg::Kind::kText:
+                simple = simple && IsPlain(*arg.text_);
+                bound += arg.text_->size() + 3;
+                break;
+            case CallArg::Kind::kPlain:
+                bound += arg.plain_.size + 3;
+                break;
+            case CallArg::Kind::kFlag:
+            case CallArg::Kind::kSigned:
+            case CallArg::Kind::kUnsigned:
+                bound += 25;
+                break;
+            case CallArg::Kind::kTexts:
+            case CallArg::Kind::kJson:
+                simple = false;
+                break;
+        }
+    }
     bool first = length_ == 0;
-    char* start = Room(64 + nameLength);
+    char* start = Room(simple ? bound : 64 + nameLength);
     char* out = start;
     if (!first) out = Copy(out, "}\n");
     out = Copy(out, "{\"time\":");
@@ -156,14 +189,44 @@ void CallLog::Record(Operation op, CallArgs args) {
     out = Copy(out, ",\"op\":\"");
     std::memcpy(out, name, nameLength);
     out = Copy(out + nameLength, "\",\"args\":[");
-    Wrote(size_t(out - start));
+    if (!simple) {
+        Wrote(size_t(out - start));
+        first = true;
+        for (const CallArg& arg : args) {
+            if (!first) Put(",", 1);
+            first = false;
+            Append(arg);
+        }
+        Put("]", 1);
+        return;
+    }
     first = true;
     for (const CallArg& arg : args) {
-        if (!first) Put(",", 1);
+        if (!first) *out++ = ',';
         first = false;
-        Append(arg);
+        switch (arg.kind_) {
+            case CallArg::Kind::kText:
+                out = Quote(out, arg.text_->data(), arg.text_->size());
+                break;
+            case CallArg::Kind::kPlain:
+                out = Quote(out, arg.plain_.data, arg.plain_.size);
+                break;
+            case CallArg::Kind::kFlag:
+                out = arg.number_ != 0 ? Copy(out, "true") : Copy(out, "false");
+                break;
+            case CallArg::Kind::kSigned:
+                out = std::to_chars(out, out + 24, int64_t(arg.number_)).ptr;
+                break;
+            case CallArg::Kind::kUnsigned:
+                out = std::to_chars(out, out + 24, arg.number_).ptr;
+                break;
+            case CallArg::Kind::kTexts:
+            case CallArg::Kind::kJson:
+                break;
+        }
     }
-    Put("]", 1);
+    *out++ = ']';
+    Wrote(size_t(out - start));
 }
 
 void CallLog::Append(const CallArg& arg) {
@@ -171,6 +234,11 @@ void CallLog::Append(const CallArg& arg) {
         case CallArg::Kind::kText:
             Append(*arg.text_);
             break;
+        case CallArg::Kind::kPlain: {
+            char* start = Room(arg.plain_.size + 2);
+            Wrote(size_t(Quote(start, arg.plain_.data, arg.plain_.size) - start));
+            break;
+        }
         case CallArg::Kind::kFlag:
             if (arg.number_ != 0) {
                 Put("true", 4);
@@ -203,15 +271,12 @@ void CallLog::Append(const CallArg& arg) {
 
 void CallLog::Append(const std::string& text) {
     if (!IsPlain(text)) {
-        const std::string& json = writer_->Text(text);
+        const std::string& json = Serialized(text);
         Put(json.data(), json.size());
         return;
     }
-    char* out = Room(text.size() + 2);
-    out[0] = '"';
-    std::memcpy(out + 1, text.data(), text.size());
-    out[text.size() + 1] = '"';
-    Wrote(text.size() + 2);
+    char* start = Room(text.size() + 2);
+    Wrote(size_t(Quote(start, text.data(), text.size()) - start));
 }
 
 void CallLog::Append(const Json& value) {
@@ -225,9 +290,14 @@ void CallLog::Append(const Json& value) {
     } else if (value.is_string()) {
         Append(value.get_ref<const std::string&>());
     } else {
-        const std::string& json = writer_->Text(value);
+        const std::string& json = Serialized(value);
         Put(json.data(), json.size());
     }
+}
+
+const std::string& CallLog::Serialized(const Json& value) {
+    if (!writer_) writer_ = std::make_unique<Writer>();
+    return writer_->Text(value);
 }
 
 void CallLog::NoteError(const std::string& message) {

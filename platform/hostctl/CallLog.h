@@ -12,6 +12,7 @@
 #include <initializer_list>
 #include <memory>
 #include <string>
+#include <string_view>
 #include <type_traits>
 #include <vector>
 
@@ -39,13 +40,25 @@ class CallArg {
           number_(static_cast<uint64_t>(number)) {}
     CallArg(const std::vector<std::string>& texts) : kind_(Kind::kTexts), texts_(&texts) {}
     CallArg(const Json& value) : kind_(Kind::kJson), json_(&value) {}
+    // A text that is its own JSON string's content (a UUID's text form, say): printable ASCII
+    // without a quote or a backslash, written without looking at it.
+    static CallArg Plain(std::string_view text) {
+        CallArg arg(false);
+        arg.kind_ = Kind::kPlain;
+        arg.plain_ = {text.data(), text.size()};
+        return arg;
+    }
 
   private:
     friend class CallLog;
-    enum class Kind { kText, kFlag, kSigned, kUnsigned, kTexts, kJson };
+    enum class Kind { kText, kPlain, kFlag, kSigned, kUnsigned, kTexts, kJson };
     Kind kind_;
     union {
         const std::string* text_;
+        struct {
+            const char* data;
+            size_t size;
+        } plain_;
         uint64_t number_;
         const std::vector<std::string>* texts_;
         const Json* json_;
@@ -84,6 +97,7 @@ class CallLog {
     void Append(const CallArg& arg);
     void Append(const std::string& text);
     void Append(const Json& value);
+    const std::string& Serialized(const Json& value);  // the JSON text of what is not plain
 
     // The log's text as it will be written, in blocks_ (length_ bytes in all), but for the
     // closing brace of the last call, which an error may still extend. A listing of thousands
@@ -96,9 +110,10 @@ class CallLog {
     static constexpr size_t kBlockSize = 64 * 1024;
     std::vector<Block> blocks_;
     size_t length_ = 0;
-    int64_t second_ = 0;        // the second of the last call's time
-    char secondText_[24] = {};  // its text
-    std::unique_ptr<Writer> writer_;
+    int64_t second_ = -1;             // the second of the last call's time
+    char secondText_[24] = {};        // its text,
+    size_t secondLength_ = 0;         // of this length
+    std::unique_ptr<Writer> writer_;  // made for the first text that is not plain
 };
 
 }  // namespace HostCtlSim

@@ -144,7 +144,8 @@ Uuid SimHost::StringToMeskUuid(const std::string& text) {
 std::string SimHost::MeskUuidToString(const Uuid& uuid) {
     std::string text = HostBackend::MeskUuidToString(uuid);
     // Logged before it is handed over.
-    return Serve(*this, Operation::MeskUuidToString, {text}, [&] { return std::move(text); });
+    return Serve(*this, Operation::MeskUuidToString, {CallArg::Plain(text)},
+                 [&] { return std::move(text); });
 }
 
 size_t SimHost::UTF8StringCharLength(const std::string& text) {

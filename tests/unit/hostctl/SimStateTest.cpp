@@ -126,6 +126,10 @@ TEST_F(SimState, CallLogHoldsTheLastInvocationsCallsInOrder) {
     Info().JoinCluster(cluster, false, "", true, 0);
     EXPECT_THROW(Info().AddDisks(kHdd1, {kHdd2}), MeskCtlException);
     Info().GetDatastoreName();
+    MeskUtil::MeskUuidToString(cluster);
+    EXPECT_THROW(MeskUtil::StringToMeskUuid("a \"uuid\"\n"), MeskCtlException);
+    HostCtl::Mesk::MeskDiskInfo disk;
+    EXPECT_THROW(Info().GetDiskInfo(cluster, {nullptr, nullptr}, disk), MeskCtlException);
     NewInvocation();
     std::vector<Json> expected = {
         J(R"({"op":"StringToMeskUuid","args":["52f1c2a0-7b3e-4d01-9a6e-00a1b2c3d4e5"]})"),
@@ -135,6 +139,11 @@ TEST_F(SimState, CallLogHoldsTheLastInvocationsCallsInOrder) {
         J(R"({"op":"AddDisks","args":["mpx.pthba2:C0:T1:L0",["mpx.pthba2:C0:T2:L0"]],
             "error":"Disk 'mpx.pthba2:C0:T1:L0' is not an SSD"})"),
         J(R"({"op":"GetDatastoreName","args":[]})"),
+        J(R"({"op":"MeskUuidToString","args":["52f1c2a0-7b3e-4d01-9a6e-00a1b2c3d4e5"]})"),
+        J(R"({"op":"StringToMeskUuid","args":["a \"uuid\"\n"],
+            "error":"Invalid UUID: 'a \"uuid\"\n'"})"),
+        J(R"({"op":"GetDiskInfo","args":["52f1c2a0-7b3e-4d01-9a6e-00a1b2c3d4e5",2],
+            "error":"No Mesk disk with UUID 52f1c2a0-7b3e-4d01-9a6e-00a1b2c3d4e5"})"),
     };
     EXPECT_EQ(LoggedCalls(*host_), expected);
 
