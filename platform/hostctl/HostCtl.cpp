@@ -3,7 +3,6 @@
 #include <arpa/inet.h>
 #include <sys/random.h>
 
-#include <array>
 #include <cctype>
 #include <cerrno>
 #include <cstdarg>
@@ -15,6 +14,7 @@
 #include "HostBackend.h"
 #include "SimHost.h"
 #include "SimInfo.h"
+#include "UuidText.h"
 #include "hostctl/HostUuid.h"
 #include "hostctl/MeskCtlException.h"
 #include "hostctl/MeskInfo.h"
@@ -193,42 +193,6 @@ const PolicyClassName kPolicyClasses[] = {
     {HostCtl::Mesk::MESK_POLICY_CLASS_VMEM, "vmem"},
 };
 
-// The value of each hexadecimal digit, 16 for any other character.
-constexpr auto kHexValues = [] {
-    std::array<uint8_t, 256> values{};
-    for (auto& value : values) value = 16;
-    for (int c = 0; c < 10; ++c) values[size_t('0' + c)] = uint8_t(c);
-    for (int c = 0; c < 6; ++c) values[size_t('a' + c)] = values[size_t('A' + c)] = uint8_t(10 + c);
-    return values;
-}();
-
-// Where each byte's two digits start in the 36-character text form.
-constexpr size_t kDigitPositions[16] = {0, 2, 4, 6, 9, 11, 14, 16, 19, 21, 24, 26, 28, 30, 32, 34};
-
-// Parses the 36-character UUID text form; false for anything else.
-bool ParseUuid(const char* text, size_t length, Uuid& uuid) {
-    if (length != 36 || text[8] != '-' || text[13] != '-' || text[18] != '-' || text[23] != '-') {
-        return false;
-    }
-    unsigned invalid = 0;
-    for (size_t byte = 0; byte < 16; ++byte) {
-        unsigned high = kHexValues[static_cast<unsigned char>(text[kDigitPositions[byte]])];
-        unsigned low = kHexValues[static_cast<unsigned char>(text[kDigitPositions[byte] + 1])];
-        invalid |= high | low;
-        uuid.bytes[byte] = static_cast<uint8_t>(high << 4 | low);
-    }
-    return invalid < 16;
-}
-
-void FormatUuid(const Uuid& uuid, char* out) {
-    static const char kDigits[] = "0123456789abcdef";
-    std::memcpy(out, "xxxxxxxx-xxxx-xxxx-xxxx-xxxxxxxxxxxx", 37);
-    for (size_t byte = 0; byte < 16; ++byte) {
-        out[kDigitPositions[byte]] = kDigits[uuid.bytes[byte] >> 4];
-        out[kDigitPositions[byte] + 1] = kDigits[uuid.bytes[byte] & 0xf];
-    }
-}
-
 // A random (version 4) UUID, from the kernel's random source.
 bool RandomUuid(Uuid& uuid) {
     size_t got = 0;
@@ -269,7 +233,7 @@ Uuid HostBackend::StringToMeskUuid(const std::string& text) {
 std::string HostBackend::MeskUuidToString(const Uuid& uuid) {
     char text[37];
     FormatUuid(uuid, text);
-    return text;
+    return std::string(text, 36);
 }
 
 size_t HostBackend::UTF8StringCharLength(const std::string& text) {

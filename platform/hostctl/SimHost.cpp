@@ -4,6 +4,7 @@
 #include <ctime>
 
 #include "SimInfo.h"
+#include "UuidText.h"
 
 namespace HostCtlSim {
 
@@ -137,8 +138,13 @@ std::string SimHost::GetFormattedSystemDateTime() {
 }
 
 Uuid SimHost::StringToMeskUuid(const std::string& text) {
-    return Serve(*this, Operation::StringToMeskUuid, {text},
-                 [&] { return HostBackend::StringToMeskUuid(text); });
+    // A text that parses is plain, and is logged without another look at it.
+    Uuid uuid;
+    if (!ParseUuid(text.data(), text.size(), uuid)) {
+        return Serve(*this, Operation::StringToMeskUuid, {text},
+                     [&] { return HostBackend::StringToMeskUuid(text); });
+    }
+    return Serve(*this, Operation::StringToMeskUuid, {CallArg::Plain(text)}, [&] { return uuid; });
 }
 
 std::string SimHost::MeskUuidToString(const Uuid& uuid) {

@@ -1,7 +1,9 @@
 // The simulated host's answers about disks and disk groups.
 #include <algorithm>
+#include <string_view>
 
 #include "SimInfo.h"
+#include "UuidText.h"
 
 namespace HostCtlSim {
 
@@ -111,14 +113,28 @@ void SetGroupMounted(StateStore& store, const Disk& ssd, bool mounted) {
 
 class SimLun : public MeskDiskLun {
   public:
-    SimLun(std::string name, const Uuid& uuid) : name_(std::move(name)), uuid_(uuid) {}
+    SimLun(std::string_view name, const Uuid& uuid) : name_(name), uuid_(uuid) {}
     Uuid GetUuid() const override { return uuid_; }
-    std::string GetName() const override { return name_; }
+    std::string GetName() const override { return std::string(name_); }
 
   private:
-    std::string name_;
+    std::string_view name_;  // in its listing's names
     Uuid uuid_;
 };
+
+// The LUNs of one GetMeskDisks, made in two allocations however many there are: each LUN
+// handed out shares the ownership of the whole listing.
+struct LunListing {
+    std::string names;  // every LUN's name, one after the other
+    std::vector<SimLun> luns;
+};
+
+// The UUID of store.Disks()[i]; throws for a disk whose text is not a UUID.
+Uuid UuidOfDisk(SimHost& host, StateStore& store, size_t i) {
+    const Uuid& uuid = store.DiskUuids()[i];
+    if (uuid != Uuid()) return uuid;
+    return host.HostBackend::StringToMeskUuid(store.Disks()[i].uuid);
+}
 
 void Tag(SimHost& host, const std::string& name, bool tagged) {
     host.Modify([&](StateStore& store) {
@@ -138,18 +154,20 @@ void Tag(SimHost& host, const std::string& name, bool tagged) {
 void SimInfo::GetMeskDiskUuids(std::vector<Uuid>& uuids) {
     Serve(host_, Operation::GetMeskDiskUuids, {}, [&] {
         uuids.clear();
-        for (const Disk& disk : Store().Disks()) {
-            if (IsGrouped(disk)) uuids.push_back(host_.HostBackend::StringToMeskUuid(disk.uuid));
+        const std::vector<Disk>& disks = Store().Disks();
+        for (size_t i = 0; i < disks.size(); ++i) {
+            if (IsGrouped(disks[i])) uuids.push_back(UuidOfDisk(host_, Store(), i));
         }
     });
 }
 
 void SimInfo::GetDiskInfo(const Uuid& uuid, const std::vector<std::shared_ptr<MeskDiskLun>>& luns,
                           MeskDiskInfo& info) {
-    std::string text = host_.HostBackend::MeskUuidToString(uuid);
-    Serve(host_, Operation::GetDiskInfo, {text, luns.size()}, [&] {
-        const Disk* disk = Store().FindDisk(text);
-        if (disk == nullptr) Refuse("No Mesk disk with UUID " + text);
+    char text[37];
+    FormatUuid(uuid, text);
+    Serve(host_, Operation::GetDiskInfo, {CallArg::Plain({text, 36}), luns.size()}, [&] {
+        const Disk* disk = Store().FindDisk(uuid);
+        if (disk == nullptr) Refuse(std::string("No Mesk disk with UUID ") + text);
         info.name = disk->name;
         info.isSsd = disk->isSsd;
         info.meskUuid = disk->uuid;
@@ -300,11 +318,25 @@ void SimInfo::SetAutoClaimMode(bool enabled) {
 
 void SimHost::GetMeskDisks(std::vector<std::shared_ptr<MeskDiskLun>>& luns) {
     Serve(*this, Operation::GetMeskDisks, {}, [&] {
-        for (const Disk& disk : Store().Disks()) {
-            if (!disk.lun) continue;
-            luns.push_back(
-                std::make_shared<SimLun>(disk.name, HostBackend::StringToMeskUuid(disk.uuid)));
+        const std::vector<Disk>& disks = Store().Disks();
+        auto listing = std::make_shared<LunListing>();
+        size_t count = 0, bytes = 0;
+        for (const Disk& disk : disks) {
+            count += disk.lun;
+            bytes += disk.lun ? disk.name.size() : 0;
         }
+        // Reserved whole, so that the names the LUNs point at stay where they are.
+        listing->names.reserve(bytes);
+        listing->luns.reserve(count);
+        for (size_t i = 0; i < disks.size(); ++i) {
+            if (!disks[i].lun) continue;
+            listing->names += disks[i].name;
+            std::string_view name(listing->names);
+            listing->luns.emplace_back(name.substr(name.size() - disks[i].name.size()),
+                                       UuidOfDisk(*this, Store(), i));
+        }
+        luns.reserve(luns.size() + count);
+        for (SimLun& lun : listing->luns) luns.emplace_back(listing, &lun);
     });
 }
 

@@ -4,8 +4,10 @@
 
 #include <algorithm>
 #include <cstdlib>
+#include <cstring>
 #include <stdexcept>
 
+#include "UuidText.h"
 #include "hostctl/MeskCtlException.h"
 
 using HostCtl::Lib::Mesk::MeskCtlException;
@@ -152,6 +154,7 @@ void StateStore::Forget() {
     faults_.clear();
     disksLoaded_ = false;
     disks_.clear();
+    diskUuids_.clear();
     byUuid_.Clear();
     byDevice_.Clear();
 }
@@ -273,22 +276,61 @@ void StateStore::WriteSection(std::string_view name, const Json& value) {
     }
 }
 
+namespace {
+
+// Finds a disk by UUID in DiskIndex. Every bit of the UUID reaches the low bits that pick the
+// slot: the UUIDs of a populated host differ only in their last bytes.
+struct UuidKey {
+    const std::vector<HostCtl::Mesk::Uuid>& uuids;
+    const HostCtl::Mesk::Uuid& uuid;
+    size_t Hash() const {
+        uint64_t low, high;
+        std::memcpy(&low, uuid.bytes, 8);
+        std::memcpy(&high, uuid.bytes + 8, 8);
+        uint64_t mixed = low ^ (high * 0x9e3779b97f4a7c15);
+        mixed = (mixed ^ (mixed >> 33)) * 0xff51afd7ed558ccd;
+        mixed = (mixed ^ (mixed >> 33)) * 0xc4ceb9fe1a85ec53;
+        return size_t(mixed ^ (mixed >> 33));
+    }
+    bool Is(uint32_t position) const { return uuids[position] == uuid; }
+};
+
+// Finds a disk by device name.
+struct NameKey {
+    const std::vector<Disk>& disks;
+    std::string_view name;
+    size_t Hash() const { return std::hash<std::string_view>()(name); }
+    bool Is(uint32_t position) const { return disks[position].name == name; }
+};
+
+}  // namespace
+
 void StateStore::LoadDisks() {
     if (disksLoaded_) return;
     BeginRead();
     static const std::string select = "SELECT " + DiskColumns() + " FROM disk ORDER BY position";
     Use query(Statement(select.c_str()));
     disks_.clear();
+    diskUuids_.clear();
     int step;
     while ((step = sqlite3_step(query)) == SQLITE_ROW) {
         Disk& disk = disks_.emplace_back();
         int column = 0;
         ForEachDiskField(
             disk, [&](const char*, auto& member, DiskCheck) { Read(query, column++, member); });
+        HostCtl::Mesk::Uuid& uuid = diskUuids_.emplace_back();
+        if (!ParseUuid(disk.uuid.data(), disk.uuid.size(), uuid)) uuid = HostCtl::Mesk::Uuid();
     }
     if (step != SQLITE_DONE) Fail("cannot read the disks");
-    byUuid_.Build(disks_);
-    byDevice_.Build(disks_, &Disk::lun);
+    byUuid_.Reserve(disks_.size());
+    byDevice_.Reserve(disks_.size());
+    for (uint32_t i = 0; i < disks_.size(); ++i) {
+        // A text that is not a UUID matches no UUID, not even the nil one.
+        if (diskUuids_[i] != HostCtl::Mesk::Uuid() || IsUuidText(disks_[i].uuid)) {
+            byUuid_.Add(i, UuidKey{diskUuids_, diskUuids_[i]});
+        }
+        if (disks_[i].lun) byDevice_.Add(i, NameKey{disks_, disks_[i].name});
+    }
     disksLoaded_ = true;
 }
 
@@ -297,40 +339,54 @@ const std::vector<Disk>& StateStore::Disks() {
     return disks_;
 }
 
-const Disk* StateStore::FindDisk(const std::string& uuid) {
+const std::vector<HostCtl::Mesk::Uuid>& StateStore::DiskUuids() {
     LoadDisks();
-    return byUuid_.Find(disks_, uuid);
+    return diskUuids_;
+}
+
+const Disk* StateStore::FindDisk(const HostCtl::Mesk::Uuid& uuid) {
+    LoadDisks();
+    int64_t position = byUuid_.Find(UuidKey{diskUuids_, uuid});
+    return position < 0 ? nullptr : &disks_[size_t(position)];
+}
+
+const Disk* StateStore::FindDisk(const std::string& uuid) {
+    HostCtl::Mesk::Uuid parsed;
+    if (!ParseUuid(uuid.data(), uuid.size(), parsed)) return nullptr;
+    return FindDisk(parsed);
 }
 
 const Disk* StateStore::FindDevice(const std::string& name) {
     LoadDisks();
-    return byDevice_.Find(disks_, name);
+    int64_t position = byDevice_.Find(NameKey{disks_, name});
+    return position < 0 ? nullptr : &disks_[size_t(position)];
 }
 
-void StateStore::DiskIndex::Build(const std::vector<Disk>& disks, bool Disk::*onlyWith) {
+void StateStore::DiskIndex::Reserve(size_t count) {
     size_t size = 16;
-    while (size < 2 * disks.size()) size *= 2;
+    while (size < 2 * count) size *= 2;
     slots_.assign(size, 0);
-    for (size_t i = 0; i < disks.size(); ++i) {
-        if (onlyWith != nullptr && !(disks[i].*onlyWith)) continue;
-        const std::string& key = disks[i].*key_;
-        size_t slot = std::hash<std::string_view>()(key) & (size - 1);
-        while (slots_[slot] != 0 && disks[slots_[slot] - 1].*key_ != key) {
-            slot = (slot + 1) & (size - 1);
-        }
-        if (slots_[slot] == 0) slots_[slot] = static_cast<uint32_t>(i + 1);
-    }
 }
 
-const Disk* StateStore::DiskIndex::Find(const std::vector<Disk>& disks,
-                                        std::string_view key) const {
-    if (slots_.empty()) return nullptr;
-    size_t slot = std::hash<std::string_view>()(key) & (slots_.size() - 1);
-    for (; slots_[slot] != 0; slot = (slot + 1) & (slots_.size() - 1)) {
-        const Disk& disk = disks[slots_[slot] - 1];
-        if (disk.*key_ == key) return &disk;
+template <class Key>
+void StateStore::DiskIndex::Add(uint32_t position, const Key& key) {
+    size_t mask = slots_.size() - 1;
+    size_t slot = key.Hash() & mask;
+    while (slots_[slot] != 0) {
+        if (key.Is(slots_[slot] - 1)) return;
+        slot = (slot + 1) & mask;
     }
-    return nullptr;
+    slots_[slot] = position + 1;
+}
+
+template <class Key>
+int64_t StateStore::DiskIndex::Find(const Key& key) const {
+    if (slots_.empty()) return -1;
+    size_t mask = slots_.size() - 1;
+    for (size_t slot = key.Hash() & mask; slots_[slot] != 0; slot = (slot + 1) & mask) {
+        if (key.Is(slots_[slot] - 1)) return slots_[slot] - 1;
+    }
+    return -1;
 }
 
 void StateStore::WriteDisk(const Disk& disk) {
@@ -341,7 +397,7 @@ void StateStore::WriteDisk(const Disk& disk) {
     BindDisk(statement, 2, disk);
     if (sqlite3_step(statement) != SQLITE_DONE) Fail("cannot write a disk");
     // The cache follows, unless the disk moves in an index.
-    const Disk* cached = disksLoaded_ ? byUuid_.Find(disks_, disk.uuid) : nullptr;
+    const Disk* cached = disksLoaded_ ? FindDisk(disk.uuid) : nullptr;
     if (cached != nullptr && cached->name == disk.name && cached->lun == disk.lun) {
         disks_[static_cast<size_t>(cached - disks_.data())] = disk;
     } else {

@@ -28,6 +28,7 @@
 #include <vector>
 
 #include "StateDocument.h"
+#include "hostctl/MeskTypes.h"
 
 namespace HostCtlSim {
 
@@ -83,8 +84,12 @@ class StateStore {
     Json ReadExtra(std::string_view name);
     // Every disk, in inventory order.
     const std::vector<Disk>& Disks();
-    // The disk with that UUID (lower case), or nullptr.
-    const Disk* FindDisk(const std::string& uuid);
+    // The UUID of each disk of Disks(), at the same position; a nil UUID where the disk's
+    // text is not a UUID (only a state changed by hand has one).
+    const std::vector<HostCtl::Mesk::Uuid>& DiskUuids();
+    // The disk with that UUID, or nullptr.
+    const Disk* FindDisk(const HostCtl::Mesk::Uuid& uuid);
+    const Disk* FindDisk(const std::string& uuid);  // its text form
     // The disk for which the host has a device of that name, or nullptr.
     const Disk* FindDevice(const std::string& name);
     // The whole host without its services.
@@ -115,19 +120,21 @@ class StateStore {
     void Forget();
     void LoadSections();
     void LoadDisks();
-    // An index of disks_ by one text field: open addressing over their positions, so that
-    // indexing thousands of disks allocates once.
+    // An index of disks_ by a key: open addressing over their positions, so that indexing
+    // thousands of disks allocates once. `Key` gives the hash of a position's key and tells
+    // whether a position's key is the one sought.
     class DiskIndex {
       public:
-        explicit DiskIndex(std::string Disk::*key) : key_(key) {}
         void Clear() { slots_.clear(); }
-        // Indexes `disks` (only those with the flag `onlyWith` set, when given); of disks
-        // with equal keys, the first is found.
-        void Build(const std::vector<Disk>& disks, bool Disk::*onlyWith = nullptr);
-        const Disk* Find(const std::vector<Disk>& disks, std::string_view key) const;
+        void Reserve(size_t count);  // before the first Add
+        // Of positions with equal keys, the first added is found.
+        template <class Key>
+        void Add(uint32_t position, const Key& key);
+        // The position with that key, or -1.
+        template <class Key>
+        int64_t Find(const Key& key) const;
 
       private:
-        std::string Disk::*key_;
         std::vector<uint32_t> slots_;  // a position plus one; 0 in an empty slot
     };
     sqlite3_stmt* Statement(const char* sql);
@@ -157,9 +164,10 @@ class StateStore {
     std::vector<Fault> faults_;
     bool disksLoaded_ = false;
     std::vector<Disk> disks_;
+    std::vector<HostCtl::Mesk::Uuid> diskUuids_;
     // Indexes of disks_, by UUID and, of the disks with a device, by name.
-    DiskIndex byUuid_{&Disk::uuid};
-    DiskIndex byDevice_{&Disk::name};
+    DiskIndex byUuid_;
+    DiskIndex byDevice_;
 };
 
 }  // namespace HostCtlSim
