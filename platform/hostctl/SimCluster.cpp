@@ -86,7 +86,7 @@ void EnterCluster(StateStore& store, const std::string& clusterUuid, bool witnes
 
 const MeskClusterConfig& SimInfo::GetClusterConfig() {
     return Serve(host_, Operation::GetClusterConfig, {}, [&]() -> const MeskClusterConfig& {
-        Json cluster = Store().ReadSection("cluster");
+        const Json& cluster = Store().ReadSection("cluster");
         config_.enabled = cluster["enabled"];
         config_.clusterUuid = cluster["uuid"];
         return config_;
@@ -100,7 +100,7 @@ bool SimInfo::IsWitness() {
 
 MeskConfigGeneration SimInfo::GetConfigGeneration() {
     return Serve(host_, Operation::GetConfigGeneration, {}, [&] {
-        Json g = Store().ReadSection("cluster")["configGeneration"];
+        const Json& g = Store().ReadSection("cluster")["configGeneration"];
         MeskConfigGeneration generation;
         generation.uuid = g["uuid"];
         generation.generation = g["generation"];
@@ -262,7 +262,7 @@ void SimHost::GetInfoFromKOVRA(std::vector<MeskMemberInfo>& members, std::string
                                std::string& masterUuid, std::string& backupUuid,
                                std::string& maintenanceModeState) {
     Serve(*this, Operation::GetInfoFromKOVRA, {}, [&] {
-        Json m = Store().ReadSection("membership");
+        const Json& m = Store().ReadSection("membership");
         members.clear();
         for (const Json& member : m["members"]) {
             members.push_back(MeskMemberInfo{member["uuid"], member["hostname"]});
@@ -285,14 +285,14 @@ void SimHost::GetUnicastMode(bool& unicast) {
 
 bool SimHost::IsInStretchedCluster() {
     return Serve(*this, Operation::IsInStretchedCluster, {}, [&] {
-        Json cluster = Store().ReadSection("cluster");
+        const Json& cluster = Store().ReadSection("cluster");
         return cluster["enabled"].get<bool>() && cluster["stretched"].get<bool>();
     });
 }
 
 void SimHost::GetPreferredFaultDomainInfo(std::string& id, std::string& name) {
     Serve(*this, Operation::GetPreferredFaultDomainInfo, {}, [&] {
-        Json cluster = Store().ReadSection("cluster");
+        const Json& cluster = Store().ReadSection("cluster");
         if (!cluster["enabled"].get<bool>() || !cluster["stretched"].get<bool>()) {
             Refuse("The host is not in a stretched cluster");
         }

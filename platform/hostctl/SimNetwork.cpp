@@ -11,7 +11,10 @@ std::string TrafficFlag(const std::string& trafficType) {
     Refuse("Unknown traffic type: " + Quoted(trafficType));
 }
 
-Json::iterator FindInterface(Json& interfaces, const std::string& name) {
+// `Interfaces` is Json or const Json.
+template <class Interfaces>
+auto FindInterface(Interfaces& interfaces, const std::string& name)
+    -> decltype(interfaces.begin()) {
     for (auto it = interfaces.begin(); it != interfaces.end(); ++it) {
         if ((*it)["name"] == name) return it;
     }
@@ -43,7 +46,7 @@ void CheckGroup(const char* what, const MeskIpAddress& address, bool ipv6) {
 bool SimInfo::IsZuvNicInUse(const std::string& interfaceName, const std::string& trafficType) {
     return Serve(host_, Operation::IsZuvNicInUse, {interfaceName, trafficType}, [&] {
         std::string flag = TrafficFlag(trafficType);
-        Json interfaces = Store().ReadSection("network")["interfaces"];
+        const Json& interfaces = Store().ReadSection("network")["interfaces"];
         auto it = FindInterface(interfaces, interfaceName);
         return it != interfaces.end() && (*it)[flag].get<bool>();
     });
@@ -104,8 +107,7 @@ void SimInfo::RestoreNetworkConfig() {
 std::vector<std::unique_ptr<MeskZuvNicConfig2>> SimInfo::GetZuvNicConfigs() {
     return Serve(host_, Operation::GetZuvNicConfigs, {}, [&] {
         std::vector<std::unique_ptr<MeskZuvNicConfig2>> records;
-        Json network = Store().ReadSection("network");
-        for (const Json& n : network["interfaces"]) {
+        for (const Json& n : Store().ReadSection("network")["interfaces"]) {
             records.push_back(InterfaceRecord(n));
         }
         return records;

@@ -50,7 +50,7 @@ void SimInfo::ResetFaultDomainName() {
 
 std::string SimInfo::GetDefaultPolicy(const std::string& policyClass) {
     return Serve(host_, Operation::GetDefaultPolicy, {policyClass}, [&] {
-        Json policies = Store().ReadSection("policies");
+        const Json& policies = Store().ReadSection("policies");
         if (!policies.contains(policyClass)) {
             Refuse("Unknown policy class: " + Quoted(policyClass));
         }
