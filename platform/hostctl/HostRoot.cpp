@@ -8,8 +8,6 @@
 #include <cerrno>
 #include <cstdio>
 #include <cstring>
-#include <fstream>
-#include <sstream>
 #include <stdexcept>
 #include <utility>
 
@@ -22,6 +20,32 @@ const char* const kServiceStatePath = "/var/lib/hostsim/mesktraced.state";
 const char* const kScriptLogPath = "/var/log/hostsim/scripts.jsonl";
 
 namespace {
+
+// Reads the file at `path` whole into `text`; false, with `text` empty, when it cannot. (No
+// streams: the library would pay for their symbols at every load, for the sake of hostsim.)
+bool ReadFile(const std::string& path, std::string& text) {
+    text.clear();
+    int fd = open(path.c_str(), O_RDONLY | O_CLOEXEC);
+    if (fd < 0) return false;
+    char buffer[65536];
+    ssize_t got;
+    while ((got = read(fd, buffer, sizeof buffer)) > 0 || (got < 0 && errno == EINTR)) {
+        if (got > 0) text.append(buffer, static_cast<size_t>(got));
+    }
+    close(fd);
+    return got == 0;
+}
+
+// The line of `text` that starts at `at`, without its newline, as std::getline takes it;
+// moves `at` past it. False at the end of the text.
+bool NextLine(const std::string& text, size_t& at, std::string& line) {
+    if (at >= text.size()) return false;
+    size_t end = text.find('\n', at);
+    if (end == std::string::npos) end = text.size();
+    line.assign(text, at, end - at);
+    at = end + 1;
+    return true;
+}
 
 const char* const kTraceConfig =
     "# Configuration of mesktraced, the Mesk tracing service.\n"
@@ -395,16 +419,18 @@ void HostRoot::Create(const Json& services) const {
 Json HostRoot::ReadServices(const Json& pending) const {
     Json services = DefaultHost()["services"];
     Json& trace = services["mesktraced"];
-    std::ifstream in;
+    std::string text;
+    bool read = false;
     for (const Json& file : pending.is_array() ? pending : Json::array()) {
         if (file.is_object() && file.value("path", "") == kServiceStatePath &&
             file.value("staged", "").find('/') == std::string::npos) {
-            in.open(PathOf(Split(kServiceStatePath).first) + "/" + file.value("staged", ""));
+            read = ReadFile(PathOf(Split(kServiceStatePath).first) + "/" + file.value("staged", ""),
+                            text);
         }
     }
-    if (!in.is_open()) in.open(PathOf(kServiceStatePath));
+    if (!read) ReadFile(PathOf(kServiceStatePath), text);
     std::string line;
-    while (std::getline(in, line)) {
+    for (size_t at = 0; NextLine(text, at, line);) {
         size_t equals = line.find('=');
         if (equals == std::string::npos) continue;
         std::string key = line.substr(0, equals);
@@ -422,18 +448,17 @@ Json HostRoot::ReadServices(const Json& pending) const {
 
 HostFile HostRoot::ServicesFile(const Json& services) {
     const Json& trace = services.at("mesktraced");
-    std::ostringstream text;
-    text << "state=" << trace.at("state").get<std::string>() << "\n"
-         << "status_fails=" << (trace.at("statusFails").get<bool>() ? 1 : 0) << "\n"
-         << "restart_failures=" << trace.at("restartFailures").get<int64_t>() << "\n";
-    return {kServiceStatePath, text.str(), 0644};
+    std::string text =
+        "state=" + trace.at("state").get<std::string>() + "\n" +
+        "status_fails=" + (trace.at("statusFails").get<bool>() ? "1" : "0") + "\n" +
+        "restart_failures=" + std::to_string(trace.at("restartFailures").get<int64_t>()) + "\n";
+    return {kServiceStatePath, text, 0644};
 }
 
 std::vector<CallRecord> ParseTimedLog(const std::string& text) {
     std::vector<CallRecord> records;
-    std::istringstream in(text);
     std::string line;
-    while (std::getline(in, line)) {
+    for (size_t at = 0; NextLine(text, at, line);) {
         Json entry = Json::parse(line, nullptr, false);
         if (entry.is_discarded() || !entry.is_object() || !entry.contains("time") ||
             !entry["time"].is_number_integer()) {
@@ -449,10 +474,9 @@ std::vector<CallRecord> ParseTimedLog(const std::string& text) {
 }
 
 std::vector<CallRecord> HostRoot::ReadScriptLog() const {
-    std::ifstream in(PathOf(kScriptLogPath));
-    std::ostringstream text;
-    text << in.rdbuf();
-    return ParseTimedLog(text.str());
+    std::string text;
+    ReadFile(PathOf(kScriptLogPath), text);
+    return ParseTimedLog(text);
 }
 
 }  // namespace HostCtlSim
