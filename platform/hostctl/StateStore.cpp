@@ -208,26 +208,33 @@ void StateStore::Transaction::Commit() {
 void StateStore::LoadSections() {
     if (sectionsLoaded_) return;
     BeginRead();
-    // A fault's row has its call in the third column, a section's has none.
-    Use query(Statement(
-        "SELECT name, value, NULL FROM section UNION ALL SELECT op, message, call FROM fault"));
+    // A row without a name (no section has none) stands for an injected failure, which are
+    // then read by a statement of their own: with none, as almost always, that costs nothing.
+    Use query(Statement("SELECT name, value FROM section UNION ALL SELECT NULL, NULL FROM fault"));
     sections_.clear();
     faults_.clear();
+    bool faults = false;
     int step;
     while ((step = sqlite3_step(query)) == SQLITE_ROW) {
-        if (sqlite3_column_type(query, 2) == SQLITE_NULL) {
-            Section& section = sections_.emplace_back();
-            Read(query, 0, section.name);
-            Read(query, 1, section.text);
-        } else {
-            Fault& fault = faults_.emplace_back();
-            Read(query, 0, fault.op);
-            Read(query, 1, fault.message);
-            Read(query, 2, fault.call);
+        if (sqlite3_column_type(query, 0) == SQLITE_NULL) {
+            faults = true;
+            continue;
         }
+        Section& section = sections_.emplace_back();
+        Read(query, 0, section.name);
+        Read(query, 1, section.text);
     }
     if (step != SQLITE_DONE) Fail("cannot read");
-    std::sort(faults_.begin(), faults_.end(), FaultOrder);
+    if (faults) {
+        Use failures(Statement("SELECT op, call, message FROM fault ORDER BY op, call"));
+        while ((step = sqlite3_step(failures)) == SQLITE_ROW) {
+            Fault& fault = faults_.emplace_back();
+            Read(failures, 0, fault.op);
+            Read(failures, 1, fault.call);
+            Read(failures, 2, fault.message);
+        }
+        if (step != SQLITE_DONE) Fail("cannot read the failures");
+    }
     sectionsLoaded_ = true;
 }
 
