@@ -208,8 +208,8 @@ void StateStore::Transaction::Commit() {
 void StateStore::LoadSections() {
     if (sectionsLoaded_) return;
     BeginRead();
-    // A row without a name (no section has none) stands for an injected failure, which are
-    // then read by a statement of their own: with none, as almost always, that costs nothing.
+    // A row without a name (every section has one) stands for an injected failure; the
+    // failures are then read by a statement of their own, which almost no invocation needs.
     Use query(Statement("SELECT name, value FROM section UNION ALL SELECT NULL, NULL FROM fault"));
     sections_.clear();
     faults_.clear();

@@ -9,9 +9,9 @@
 // A process that only reads opens the database read-only and writes nothing: the first read
 // begins one read transaction, which lasts until the process changes something or ends, and
 // everything it reads is kept, so that all reads of an invocation agree and each is read once.
-// The first read takes every section and every injected failure in one statement, since each
-// statement prepared costs a short command more than reading the few rows does; a section's
-// JSON text is parsed when it is first asked for.
+// The first read takes every section in one statement, which also tells whether any failure is
+// injected, since each statement prepared costs a short command more than reading the few rows
+// does; a section's JSON text is parsed when it is first asked for.
 // Every change is one BEGIN IMMEDIATE transaction on a read-write connection, so that
 // concurrent processes queue up behind a busy timeout and a killed process leaves the state as
 // it was before or after the change; reads after a change see it.
