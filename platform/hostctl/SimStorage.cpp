@@ -155,6 +155,7 @@ void SimInfo::GetMeskDiskUuids(std::vector<Uuid>& uuids) {
     Serve(host_, Operation::GetMeskDiskUuids, {}, [&] {
         uuids.clear();
         const std::vector<Disk>& disks = Store().Disks();
+        uuids.reserve(size_t(std::count_if(disks.begin(), disks.end(), IsGrouped)));
         for (size_t i = 0; i < disks.size(); ++i) {
             if (IsGrouped(disks[i])) uuids.push_back(UuidOfDisk(host_, Store(), i));
         }
