@@ -65,7 +65,7 @@ RunResult Reference(RunResult result, const std::shared_ptr<NamespaceNode>& node
 }
 
 RunResult RunCommand(CommandSpec& command, const std::vector<std::string>& words, size_t next,
-                     GlobalOptions globals) {
+                     GlobalOptions globals, const std::function<void(const std::string&)>& print) {
     RunResult result;
     std::shared_ptr<CallSpec::InputSpec> inputSpec = command.GetInputSpec();
     ParseResult parsed = ParseArguments(
@@ -122,6 +122,7 @@ RunResult RunCommand(CommandSpec& command, const std::vector<std::string>& words
         options.fieldsGiven = globals.fieldsGiven;
         options.fields = globals.fields;
         options.noHeader = globals.noHeader;
+        options.flush = print;
         result.out = formatter(*root, options);
     }
     for (const auto& message : output->GetErrorMessages()) {
@@ -165,8 +166,8 @@ bool RunBuiltin(const std::vector<std::string>& words, const std::shared_ptr<Nam
 
 // Run() without its boundary; `node` follows the path as it is resolved.
 RunResult Dispatch(const std::vector<std::string>& words,
-                   const std::shared_ptr<NamespaceNode>& root,
-                   std::shared_ptr<NamespaceNode>& node) {
+                   const std::shared_ptr<NamespaceNode>& root, std::shared_ptr<NamespaceNode>& node,
+                   const std::function<void(const std::string&)>& print) {
     RunResult result;
     if (RunBuiltin(words, root, result)) {
         return result;
@@ -209,7 +210,7 @@ RunResult Dispatch(const std::vector<std::string>& words,
             result.status = kExitCommandFailed;
             return result;
         }
-        return RunCommand(*command, words, index, globals);
+        return RunCommand(*command, words, index, globals, print);
     }
 
     if (globals.help) {
@@ -239,11 +240,12 @@ RunResult Dispatch(const std::vector<std::string>& words,
 // Plug-ins' code runs not only in a command's execution but wherever the tree is rendered
 // (help, listings, the reference and completion build the commands' input and output
 // descriptions): whatever it throws is caught here, once for all of them.
-RunResult Run(const std::vector<std::string>& words, const std::shared_ptr<NamespaceNode>& root) {
+RunResult Run(const std::vector<std::string>& words, const std::shared_ptr<NamespaceNode>& root,
+              const std::function<void(const std::string&)>& print) {
     std::shared_ptr<NamespaceNode> node = root;
     std::string what;
     try {
-        return Dispatch(words, root, node);
+        return Dispatch(words, root, node, print);
     } catch (const std::exception& e) {
         what = std::string(": ") + e.what();
     } catch (...) {

@@ -1,6 +1,7 @@
 // One invocation of autocli: from the words of the command line to texts and an exit status.
 #pragma once
 
+#include <functional>
 #include <memory>
 #include <string>
 #include <vector>
@@ -18,7 +19,7 @@ constexpr int kExitUsage = 2;          // autocli refused the command line; noth
 
 struct RunResult {
     int status = kExitSuccess;
-    std::string out;  // help and results
+    std::string out;  // help and results (what was not handed to Run's `print`)
     std::string err;  // errors, one per line
     // The command's result, for the caller to release when it likes: a process about to end
     // need not free it value by value.
@@ -32,7 +33,11 @@ struct RunResult {
 // A path that stops at a namespace prints that namespace's help: with --help that is the
 // answer (status 0); without, the command is missing, so the help goes with an error and
 // status 2, and a script that forgot a word does not take the help for a result.
-RunResult Run(const std::vector<std::string>& words, const std::shared_ptr<NamespaceNode>& root);
+//
+// With `print`, a long result goes to it in pieces as it is formatted, before Run returns:
+// an invocation printing a large listing then holds only a piece of its text at a time.
+RunResult Run(const std::vector<std::string>& words, const std::shared_ptr<NamespaceNode>& root,
+              const std::function<void(const std::string&)>& print = nullptr);
 
 // The hidden first word of a shell completion request (`autocli __complete <words...>`).
 // Its answer goes to stdout with status 0 whatever the words, and nothing to stderr.

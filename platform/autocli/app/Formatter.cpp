@@ -1,6 +1,7 @@
 // What the formatters share: output parameters, value texts, and the formatters by name.
 #include "Formatter.h"
 
+#include <algorithm>
 #include <charconv>
 
 #include <nlohmann/json.hpp>
@@ -200,6 +201,21 @@ std::string ValueText(const MetaObject* value, const std::string& unit) {
         text += " " + unit;
     }
     return text;
+}
+
+void FlushIfLarge(std::string& text, const FormatOptions& options) {
+    if (options.flush && text.size() >= kFlushSize) {
+        options.flush(text);
+        text.clear();
+    }
+}
+
+void ReserveForListing(std::string& text, size_t count, const FormatOptions& options) {
+    size_t room = text.size() * count * 9 / 8;
+    if (options.flush) {
+        room = std::min(room, kFlushSize + 2 * text.size());
+    }
+    text.reserve(room);
 }
 
 const MetaStruct* ResultStructure(const MetaObject* root) {

@@ -1,6 +1,7 @@
 // Formatters: a command's result as text for administrators and scripts.
 #pragma once
 
+#include <functional>
 #include <map>
 #include <string>
 #include <utility>
@@ -23,7 +24,19 @@ struct FormatOptions {
     std::vector<std::string> fields;
     // --no-header: no header row in the formatters whose row says they have one.
     bool noHeader = false;
+    // When set, the formatters that write a listing element by element hand it the text made
+    // so far each time it has grown past kFlushSize, and go on with an empty text: a long
+    // listing is printed as it is made instead of being held whole. The formatter returns
+    // what is left.
+    std::function<void(const std::string&)> flush;
 };
+
+// How much text a formatter holds before it hands it to FormatOptions::flush.
+constexpr size_t kFlushSize = 64 * 1024;
+
+// Hands `text` to options.flush and empties it, when there is a flush and the text has grown
+// past kFlushSize.
+void FlushIfLarge(std::string& text, const FormatOptions& options);
 
 // The command's "header:", "fields:" and "units:" parameters, looked up by structure name.
 // One layout serves the structures of one result, which must outlive it: it keeps what it
@@ -117,6 +130,10 @@ std::string PlainText(const MetaObj::MetaObject& root);
 // a result that is a list) has only those fields, in that order.
 nlohmann::ordered_json ToJson(const MetaObj::MetaObject* value,
                               const std::vector<std::string>* fields = nullptr);
+
+// Makes room in `text` for a listing of `count` elements, judged by the first one that it
+// holds now: for all of them, or for what is held until the next flush.
+void ReserveForListing(std::string& text, size_t count, const FormatOptions& options);
 
 using FormatterFunction = std::string (*)(const MetaObj::MetaObject& root,
                                           const FormatOptions& options);

@@ -78,7 +78,8 @@ namespace {
 // guaranteed to be UTF-8; a bad byte becomes U+FFFD instead of an exception.
 class JsonWriter {
   public:
-    JsonWriter(std::string& out, bool pretty) : out_(out), pretty_(pretty) {}
+    JsonWriter(std::string& out, bool pretty, const FormatOptions* options = nullptr)
+        : out_(out), pretty_(pretty), options_(options) {}
 
     // `fields`, when given, are the fields to write of a top-level structure.
     void Value(const MetaObject* value, const std::vector<std::string>* fields, size_t depth) {
@@ -260,9 +261,13 @@ class JsonWriter {
             const MetaObject* element = elements[i].get();
             const bool isStruct = element != nullptr && element->GetType() == MetaObj::META_STRUCT;
             Value(element, isStruct ? fields : nullptr, depth + 1);
-            if (i == 0 && depth == 0) {
-                // A listing's elements are alike: room for all of them, judged by the first.
-                out_.reserve(out_.size() * elements.size() * 9 / 8);
+            if (depth == 0 && options_ != nullptr) {
+                if (i == 0) {
+                    // A listing's elements are alike: room made for them, judged by the first.
+                    ReserveForListing(out_, elements.size(), *options_);
+                } else {
+                    FlushIfLarge(out_, *options_);
+                }
             }
         }
         Indent(depth);
@@ -292,6 +297,7 @@ class JsonWriter {
 
     std::string& out_;
     bool pretty_;
+    const FormatOptions* options_;  // of the whole result; nullptr for a piece of it
     // The members' names as PlainStruct writes them, with what stands before each, and the
     // structure, depth and selection they were made for.
     struct Keys {
@@ -305,7 +311,8 @@ class JsonWriter {
 
 std::string Dump(const MetaObject& root, const FormatOptions& options, bool pretty) {
     std::string text;
-    JsonWriter(text, pretty).Value(&root, options.fieldsGiven ? &options.fields : nullptr, 0);
+    JsonWriter(text, pretty, &options)
+        .Value(&root, options.fieldsGiven ? &options.fields : nullptr, 0);
     text += '\n';
     return text;
 }

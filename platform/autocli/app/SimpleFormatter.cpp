@@ -246,14 +246,15 @@ std::string FormatSimple(const MetaObject& root, const FormatOptions& options) {
             continue;
         }
         if (first) {
-            // A listing's rows are alike: room for all of them, judged by the first.
+            // A listing's rows are alike: room made for them, judged by the first.
             writer.Struct(static_cast<const MetaStruct&>(*element), 0, true);
-            text.reserve(text.size() * elements.size() * 9 / 8);
+            ReserveForListing(text, elements.size(), options);
             first = false;
             continue;
         }
         text += '\n';
         writer.Struct(static_cast<const MetaStruct&>(*element), 0, true);
+        FlushIfLarge(text, options);
     }
     return text;
 }

@@ -69,7 +69,8 @@ int main(int argc, char** argv) {
         return Output::Finish("autocli", 0);
     }
 
-    App::RunResult result = App::Run(std::vector<std::string>(argv + 1, argv + argc), root);
+    App::RunResult result =
+        App::Run(std::vector<std::string>(argv + 1, argv + argc), root, Output::Out);
     // The tree and the result stay until the process ends: freeing them object by object
     // would take longer than printing a large result.
     KeepUntilExit(std::move(root));

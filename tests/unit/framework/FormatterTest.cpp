@@ -117,6 +117,29 @@ TEST(Formatters, RowsSayWhichHonourFieldsAndNoHeader) {
     }
 }
 
+TEST(Formatters, ListingHandedOverInPiecesIsTheWholeText) {
+    auto disks = MetaList::New(META_STRUCT);
+    for (int i = 0; i < 3000; ++i) {
+        disks->Add(Struct("Disk", "Name", MetaString::New("disk-" + std::to_string(i)), "Size",
+                          MetaInt::New(i), "Ssd", MetaBool::New(i % 2 == 0)));
+    }
+    for (const auto& formatter : Formatters()) {
+        FormatOptions options = Options({{"header:Disk", "%Name%"}});
+        const std::string whole = formatter.function(*disks, options);
+        std::string pieces;
+        size_t count = 0;
+        options.flush = [&](const std::string& piece) {
+            EXPECT_GE(piece.size(), Kalmor::AutoCli::App::kFlushSize) << formatter.name;
+            pieces += piece;
+            ++count;
+        };
+        EXPECT_EQ(pieces + formatter.function(*disks, options), whole) << formatter.name;
+        // The listings that are written element by element are handed over as they grow.
+        const std::string name = formatter.name;
+        EXPECT_EQ(count > 1, name == "simple" || name == "json" || name == "json-pretty") << name;
+    }
+}
+
 TEST(Formatters, BareBooleanIsSilentWhenTrueExceptInMachineFormats) {
     const std::vector<std::vector<std::string>> cases = {
         {"simple", "", "false\n"},
