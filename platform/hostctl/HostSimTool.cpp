@@ -47,9 +47,10 @@ Commands:
                               when it begins with a dash)
   fail --clear [OPERATION]    removes every injected failure, or those of OPERATION
   fail --list                 prints the injected failures, one JSON object a line
-  calls [--clear]             prints the host-control operations of the last invocation and
-                              the host scripts it ran, in order, one JSON object a line;
-                              --clear empties the log
+  calls [--clear]             prints the host-control operations of the last invocation run
+                              with HOSTSIM_CALLS=1 (the checkout's wrappers set it) and the
+                              host scripts it ran, in order, one JSON object a line; --clear
+                              empties the log
   service mesktraced running|stopped|status-fails|restart-fails [N]
                               sets how the tracing service's control script behaves: status
                               exits 0 (running) or 3 (stopped); status-fails makes the status

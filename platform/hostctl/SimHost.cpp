@@ -71,6 +71,9 @@ SimHost::Options SimHost::OptionsFromEnvironment() {
     bool rootSet = root != nullptr && *root != '\0';
     options.hostRoot = rootSet ? root : kDefaultHostRoot;
     options.execRoot = rootSet ? root : "";
+    // Only when asked for: a listing records calls by the thousand and writes megabytes.
+    const char* calls = std::getenv("HOSTSIM_CALLS");
+    options.keepCalls = calls != nullptr && *calls != '\0' && std::string(calls) != "0";
     return options;
 }
 
@@ -86,11 +89,11 @@ SimHost& SimHost::Default() {
 SimHost::SimHost(Options options) : options_(std::move(options)), root_(options_.hostRoot) {}
 
 SimHost::~SimHost() {
-    log_.Write(root_);
+    if (options_.keepCalls) log_.Write(root_);
 }
 
 void SimHost::EndProcess() {
-    log_.Write(root_);
+    if (options_.keepCalls) log_.Write(root_);
     // A writer closes, so that the last one to close copies the log back into the database.
     // A reader's connection is left to the end of the process, which releases its locks: it
     // wrote nothing and has nothing to undo.
@@ -114,7 +117,7 @@ StateStore& SimHost::Store() {
 
 void SimHost::Enter(Operation op, CallArgs args) {
     Store();
-    log_.Record(op, args);
+    if (options_.keepCalls) log_.Record(op, args);
     int64_t count = ++callCounts_[static_cast<size_t>(op)];
     for (const Fault& fault : faults_) {
         if (fault.op == OperationName(op) && (fault.call == 0 || fault.call == count)) {
@@ -124,7 +127,7 @@ void SimHost::Enter(Operation op, CallArgs args) {
 }
 
 void SimHost::NoteError(const std::string& message) {
-    log_.NoteError(message);
+    if (options_.keepCalls) log_.NoteError(message);
 }
 
 std::unique_ptr<HostCtl::MeskPlugin> SimHost::GetMeskPlugin() {

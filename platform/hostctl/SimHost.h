@@ -30,17 +30,20 @@ class SimHost : public HostBackend {
         // Where MeskExec looks for programs: below this directory, or at the path as given
         // when it is empty.
         std::string execRoot;
+        // Whether the calls are kept in the call log, replacing the last invocation's.
+        bool keepCalls = false;
     };
 
-    // HOSTSIM_STATE (default /var/lib/hostsim/state.db) and MESK_HOST_ROOT (default
-    // /var/lib/hostsim/root; programs run at their own paths when it is unset).
+    // HOSTSIM_STATE (default /var/lib/hostsim/state.db), MESK_HOST_ROOT (default
+    // /var/lib/hostsim/root; programs run at their own paths when it is unset) and
+    // HOSTSIM_CALLS (the calls are kept when it is set, and neither empty nor 0).
     static Options OptionsFromEnvironment();
     // The process's simulated host, made on first use from the environment. It lasts until
-    // the process ends, which writes its call log.
+    // the process ends, which writes its call log when it keeps one.
     static SimHost& Default();
 
     explicit SimHost(Options options);
-    // Writes the call log.
+    // Writes the call log, when it keeps one.
     ~SimHost() override;
 
     // The state, opened (a missing database is made a fresh host, with its files).

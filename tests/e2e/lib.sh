@@ -19,6 +19,7 @@ E2E_DIR=$(mktemp -d "${TMPDIR:-/tmp}/mesk-e2e.XXXXXX")
 trap 'rm -rf "$E2E_DIR"' EXIT
 export HOSTSIM_STATE="$E2E_DIR/state.db"
 export MESK_HOST_ROOT="$E2E_DIR/root"
+export HOSTSIM_CALLS=1
 mkdir -p "$MESK_HOST_ROOT"
 
 PASSED=0

@@ -147,6 +147,13 @@ expect_out "$(cat <<'LOG'
 {"op":"LeaveCluster","args":[false]}
 LOG
 )"
+# Without HOSTSIM_CALLS (or with 0) an invocation keeps no calls and leaves the log alone.
+for keep in "" 0; do
+    HOSTSIM_CALLS=$keep run mesk datastore name get
+    expect_rc 0
+    sim calls
+    expect_out_has '{"op":"LeaveCluster","args":[false]}'
+done
 
 case_ "an injected failure reaches the command; --call picks one call"
 "$HOSTSIM" populate --luns 5

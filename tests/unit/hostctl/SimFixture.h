@@ -27,7 +27,7 @@ class SimFixture : public ::testing::Test {
     SimFixture() {
         char pattern[] = "/tmp/hostctl-test.XXXXXX";
         directory_ = mkdtemp(pattern);
-        options_ = {directory_ + "/state.db", directory_ + "/root", directory_ + "/root"};
+        options_ = {directory_ + "/state.db", directory_ + "/root", directory_ + "/root", true};
         NewInvocation();
     }
 
