@@ -1,6 +1,9 @@
 // Formatters: a command's result as text for administrators and scripts.
 #pragma once
 
+#include <charconv>
+#include <cstdint>
+#include <cstring>
 #include <functional>
 #include <map>
 #include <string>
@@ -134,6 +137,30 @@ nlohmann::ordered_json ToJson(const MetaObj::MetaObject* value,
 // Makes room in `text` for a listing of `count` elements, judged by the first one that it
 // holds now: for all of them, or for what is held until the next flush.
 void ReserveForListing(std::string& text, size_t count, const FormatOptions& options);
+
+// Writes into room made at once at the end of a text, for a piece whose greatest length is
+// known before it is written: no check of the text's capacity for each part. Done() cuts the
+// text to what was written.
+class TextRoom {
+  public:
+    TextRoom(std::string& text, size_t bytes) : text_(text) {
+        const size_t start = text.size();
+        text.resize(start + bytes);
+        out_ = &text[start];
+    }
+    void Put(const char* data, size_t size) {
+        std::memcpy(out_, data, size);
+        out_ += size;
+    }
+    void Put(const std::string& data) { Put(data.data(), data.size()); }
+    void Put(char c) { *out_++ = c; }
+    void Put(int64_t number) { out_ = std::to_chars(out_, out_ + 20, number).ptr; }
+    void Done() { text_.resize(static_cast<size_t>(out_ - text_.data())); }
+
+  private:
+    std::string& text_;
+    char* out_;
+};
 
 using FormatterFunction = std::string (*)(const MetaObj::MetaObject& root,
                                           const FormatOptions& options);

@@ -1,6 +1,5 @@
 // The "json" and "json-pretty" formatters.
 #include <algorithm>
-#include <charconv>
 #include <cstring>
 
 #include <nlohmann/json.hpp>
@@ -71,6 +70,12 @@ nlohmann::ordered_json ToJson(const MetaObject* value, const std::vector<std::st
 }
 
 namespace {
+
+// Printable ASCII without quotation marks or backslashes: a JSON string's text as it is.
+bool IsPlainJsonText(const std::string& text) {
+    return IsPlainText(text) && std::memchr(text.data(), '"', text.size()) == nullptr &&
+           std::memchr(text.data(), '\\', text.size()) == nullptr;
+}
 
 // Writes a result as JSON straight into the output, byte for byte as ToJson(...).dump() with
 // the same indentation would, without building the document first: a listing of thousands of
@@ -177,10 +182,10 @@ class JsonWriter {
                 keys_.texts.push_back(std::move(key));
             }
         }
-        size_t room = 2 + 2 * depth + 1;
+        size_t bytes = 2 + 2 * depth + 1;
         for (size_t i = 0; i < count; ++i) {
             const MetaObject* value = structure.FieldAt(indexOf(i)).value.get();
-            room += keys_.texts[i].size() + 22;
+            bytes += keys_.texts[i].size() + 22;
             if (value == nullptr || value->GetType() != MetaObj::META_STRING) {
                 if (value != nullptr && value->GetType() != MetaObj::META_BOOL &&
                     value->GetType() != MetaObj::META_INT) {
@@ -189,59 +194,51 @@ class JsonWriter {
                 continue;
             }
             const std::string& text = static_cast<const MetaObj::MetaString&>(*value).GetValue();
-            if (!IsPlainText(text) || std::memchr(text.data(), '"', text.size()) != nullptr ||
-                std::memchr(text.data(), '\\', text.size()) != nullptr) {
+            if (!IsPlainJsonText(text)) {
                 return false;
             }
-            room += text.size();
+            bytes += text.size();
         }
-        const size_t start = out_.size();
-        out_.resize(start + room);
-        char* out = &out_[start];
-        const auto put = [&out](const char* data, size_t size) {
-            std::memcpy(out, data, size);
-            out += size;
-        };
-        *out++ = '{';
+        TextRoom out(out_, bytes);
+        out.Put('{');
         for (size_t i = 0; i < count; ++i) {
-            put(keys_.texts[i].data(), keys_.texts[i].size());
+            out.Put(keys_.texts[i]);
             const MetaObject* value = structure.FieldAt(indexOf(i)).value.get();
             if (value == nullptr) {
-                put("null", 4);
+                out.Put("null", 4);
             } else if (value->GetType() == MetaObj::META_STRING) {
                 const auto& scalar = static_cast<const MetaObj::MetaString&>(*value);
                 if (scalar.HasValue()) {
-                    *out++ = '"';
-                    put(scalar.GetValue().data(), scalar.GetValue().size());
-                    *out++ = '"';
+                    out.Put('"');
+                    out.Put(scalar.GetValue());
+                    out.Put('"');
                 } else {
-                    put("null", 4);
+                    out.Put("null", 4);
                 }
             } else if (value->GetType() == MetaObj::META_BOOL) {
                 const auto& scalar = static_cast<const MetaObj::MetaBool&>(*value);
                 if (!scalar.HasValue()) {
-                    put("null", 4);
+                    out.Put("null", 4);
                 } else if (scalar.GetValue()) {
-                    put("true", 4);
+                    out.Put("true", 4);
                 } else {
-                    put("false", 5);
+                    out.Put("false", 5);
                 }
             } else {
                 const auto& scalar = static_cast<const MetaObj::MetaInt&>(*value);
                 if (scalar.HasValue()) {
-                    out = std::to_chars(out, out + 20, scalar.GetValue()).ptr;
+                    out.Put(scalar.GetValue());
                 } else {
-                    put("null", 4);
+                    out.Put("null", 4);
                 }
             }
         }
         if (pretty_) {
-            *out++ = '\n';
-            std::memset(out, ' ', 2 * depth);
-            out += 2 * depth;
+            out.Put('\n');
+            for (size_t i = 0; i < 2 * depth; ++i) out.Put(' ');
         }
-        *out++ = '}';
-        out_.resize(static_cast<size_t>(out - out_.data()));
+        out.Put('}');
+        out.Done();
         return true;
     }
 
@@ -277,8 +274,7 @@ class JsonWriter {
     void String(const std::string& text) {
         // Printable ASCII without quotation marks or backslashes, most texts, is written as
         // it is; anything else is escaped by the JSON library.
-        if (!IsPlainText(text) || std::memchr(text.data(), '"', text.size()) != nullptr ||
-            std::memchr(text.data(), '\\', text.size()) != nullptr) {
+        if (!IsPlainJsonText(text)) {
             out_ += nlohmann::ordered_json(text).dump(-1, ' ', false,
                                                       nlohmann::json::error_handler_t::replace);
             return;

@@ -1,6 +1,5 @@
 // The "simple" formatter: titled blocks of "Field: value" lines. Every text is shown through
 // ScreenText: host data never reaches the terminal raw.
-#include <cstring>
 
 #include "Formatter.h"
 #include "Text.h"
@@ -101,7 +100,7 @@ class SimpleWriter {
                      const Lines& lines) {
         const size_t count = selection.fields.size();
         values_.clear();
-        size_t room = 0;
+        size_t bytes = 0;
         for (size_t shown = 0; shown < count; ++shown) {
             const MetaObject* value = structure.FieldAt(selection.fields[shown]).value.get();
             if (value == nullptr) {
@@ -114,22 +113,16 @@ class SimpleWriter {
                 if (!IsPlainText(text)) {
                     return false;
                 }
-                room += text.size();
+                bytes += text.size();
             } else if (type != MetaObj::META_BOOL) {
                 return false;
             }
             values_.push_back(value);
-            room += lines.heads[shown].size() + lines.units[shown].size() + 7;
+            bytes += lines.heads[shown].size() + lines.units[shown].size() + 7;
         }
-        const size_t start = text_.size();
-        text_.resize(start + room);
-        char* out = &text_[start];
-        const auto put = [&out](const char* data, size_t size) {
-            std::memcpy(out, data, size);
-            out += size;
-        };
+        TextRoom out(text_, bytes);
         for (size_t shown = 0; shown < count; ++shown) {
-            put(lines.heads[shown].data(), lines.heads[shown].size());
+            out.Put(lines.heads[shown]);
             const MetaObject* value = values_[shown];
             const char* data = "";
             size_t size = 0;
@@ -145,13 +138,13 @@ class SimpleWriter {
             }
             // No value: "Name:" alone, and no unit.
             if (size != 0) {
-                *out++ = ' ';
-                put(data, size);
-                put(lines.units[shown].data(), lines.units[shown].size());
+                out.Put(' ');
+                out.Put(data, size);
+                out.Put(lines.units[shown]);
             }
-            *out++ = '\n';
+            out.Put('\n');
         }
-        text_.resize(static_cast<size_t>(out - text_.data()));
+        out.Done();
         return true;
     }
 
