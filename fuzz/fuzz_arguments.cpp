@@ -188,7 +188,7 @@ std::string CheckAccepted(const std::vector<std::string>& words) {
     App::ParseResult parsed = App::ParseArguments(
         std::vector<std::string>(words.begin() + static_cast<std::ptrdiff_t>(next), words.end()),
         *spec, &globals);
-    if (!parsed.error.empty() || parsed.helpRequested) return std::string();
+    if (!parsed.error.empty() || parsed.documentationRequested) return std::string();
 
     for (const auto& parameter : spec->GetParameters()) {
         const std::string& name = parameter->GetName();
