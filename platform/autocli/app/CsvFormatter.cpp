@@ -12,19 +12,22 @@ namespace {
 // Quotes a cell when it holds a comma, a quotation mark or a line break, doubling the
 // quotation marks inside. Bytes that are not UTF-8 become U+FFFD, as in the JSON output, so
 // that a reader decoding UTF-8 gets the same text from both.
-std::string Cell(const std::string& raw) {
-    const std::string value = ValidUtf8(raw);
+void AppendCell(std::string& text, const std::string& raw) {
+    const bool plain = IsPlainText(raw);  // printable ASCII is valid UTF-8 as it stands
+    const std::string clean = plain ? std::string() : ValidUtf8(raw);
+    const std::string& value = plain ? raw : clean;
     if (value.find_first_of(",\"\r\n") == std::string::npos) {
-        return value;
+        text += value;
+        return;
     }
-    std::string quoted = "\"";
+    text += '"';
     for (char c : value) {
-        quoted += c;
+        text += c;
         if (c == '"') {
-            quoted += '"';
+            text += '"';
         }
     }
-    return quoted + "\"";
+    text += '"';
 }
 
 void AppendRow(std::string& text, const std::vector<std::string>& cells) {
@@ -32,7 +35,7 @@ void AppendRow(std::string& text, const std::vector<std::string>& cells) {
         if (i != 0) {
             text += ',';
         }
-        text += Cell(cells[i]);
+        AppendCell(text, cells[i]);
     }
     text += "\r\n";
 }
@@ -65,6 +68,7 @@ std::string FormatCsv(const MetaObj::MetaObject& root, const FormatOptions& opti
     }
     for (const auto& row : grid.rows) {
         AppendRow(text, row);
+        FlushIfLarge(text, options);
     }
     return text;
 }

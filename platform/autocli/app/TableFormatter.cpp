@@ -15,15 +15,22 @@ constexpr char kColumnGap[] = "  ";
 
 void AppendRow(std::string& text, const std::vector<std::string>& cells,
                const std::vector<size_t>& widths) {
-    std::string line;
+    const size_t start = text.size();
     for (size_t i = 0; i < cells.size(); ++i) {
         if (i != 0) {
-            line += kColumnGap;
+            text += kColumnGap;
         }
-        line += i + 1 == cells.size() ? cells[i] : PadRight(cells[i], widths[i]);
+        text += cells[i];
+        if (i + 1 != cells.size()) {
+            const size_t width = DisplayWidth(cells[i]);
+            if (width < widths[i]) {
+                text.append(widths[i] - width, ' ');
+            }
+        }
     }
-    size_t end = line.find_last_not_of(' ');
-    text += (end == std::string::npos ? std::string() : line.substr(0, end + 1)) + "\n";
+    const size_t end = text.find_last_not_of(' ');
+    text.resize(end == std::string::npos || end < start ? start : end + 1);
+    text += '\n';
 }
 
 }  // namespace
@@ -63,6 +70,7 @@ std::string FormatTable(const MetaObj::MetaObject& root, const FormatOptions& op
     }
     for (const auto& row : grid.rows) {
         AppendRow(text, row, widths);
+        FlushIfLarge(text, options);
     }
     return text;
 }

@@ -169,9 +169,12 @@ std::string DidYouMean(const std::string& word, const std::vector<std::string>& 
 }
 
 size_t DisplayWidth(const std::string& text) {
+    // Printable ASCII, by far the most common, is one column per byte without asking wcwidth.
+    if (IsPlainText(text)) {
+        return text.size();
+    }
     size_t width = 0;
     size_t pos = 0;
-    // Printable ASCII, by far the most common, is one column per byte without asking wcwidth.
     while (pos < text.size() && text[pos] >= 0x20 && text[pos] < 0x7F) {
         ++pos;
         ++width;

@@ -29,47 +29,48 @@ namespace {
 constexpr size_t kIndentStep = 2;
 
 // Escapes markup characters and leaves out what XML 1.0 cannot carry at all, so that the
-// document stays well-formed whatever the host reported.
-std::string Escape(const std::string& raw) {
-    std::string text;
-    for (char c : ValidUtf8(raw, true)) {
-        switch (c) {
+// document stays well-formed whatever the host reported. In an attribute value, parsers turn
+// a literal tab or line break into a blank, so those are written as character references to
+// read back unchanged.
+void AppendEscaped(std::string& out, const std::string& raw, bool attribute) {
+    const bool plain = IsPlainText(raw);  // printable ASCII: only markup characters change
+    const std::string clean = plain ? std::string() : ValidUtf8(raw, true);
+    const std::string& text = plain ? raw : clean;
+    size_t start = 0;
+    for (size_t i = 0; i < text.size(); ++i) {
+        const char* entity = nullptr;
+        switch (text[i]) {
             case '&':
-                text += "&amp;";
+                entity = "&amp;";
                 break;
             case '<':
-                text += "&lt;";
+                entity = "&lt;";
                 break;
             case '>':
-                text += "&gt;";
+                entity = "&gt;";
                 break;
             case '"':
-                text += "&quot;";
+                entity = "&quot;";
                 break;
             case '\r':
-                text += "&#13;";
+                entity = "&#13;";
+                break;
+            case '\t':
+                entity = attribute ? "&#9;" : nullptr;
+                break;
+            case '\n':
+                entity = attribute ? "&#10;" : nullptr;
                 break;
             default:
-                text += c;
+                break;
+        }
+        if (entity != nullptr) {
+            out.append(text, start, i - start);
+            out += entity;
+            start = i + 1;
         }
     }
-    return text;
-}
-
-// An attribute value: parsers turn a literal tab or line break there into a blank, so those
-// are written as character references to read back unchanged.
-std::string EscapeAttribute(const std::string& raw) {
-    std::string text;
-    for (char c : Escape(raw)) {
-        if (c == '\t') {
-            text += "&#9;";
-        } else if (c == '\n') {
-            text += "&#10;";
-        } else {
-            text += c;
-        }
-    }
-    return text;
+    out.append(text, start, std::string::npos);
 }
 
 const char* ElementName(MetaObj::MetaType type) {
@@ -93,84 +94,121 @@ bool IsScalar(const MetaObject* value) {
            (value->GetType() != MetaObj::META_STRUCT && value->GetType() != MetaObj::META_LIST);
 }
 
-// A scalar on one line: <integer>42</integer>, or <string/> without a value. A missing value
-// (a null field) is written as an empty string.
-std::string Scalar(const MetaObject* value) {
-    const char* name = value ? ElementName(value->GetType()) : "string";
-    std::string text = ValueText(value);
-    bool hasValue = value != nullptr && !text.empty();
-    if (value && value->GetType() == MetaObj::META_STRING) {
-        hasValue = static_cast<const MetaObj::MetaString*>(value)->HasValue();
-    }
-    if (!hasValue) {
-        return std::string("<") + name + "/>";
-    }
-    return std::string("<") + name + ">" + Escape(text) + "</" + name + ">";
-}
+class XmlWriter {
+  public:
+    XmlWriter(std::string& out, const FormatOptions& options) : out_(out), options_(options) {}
 
-void AppendLine(std::string& text, size_t indent, const std::string& line) {
-    text.append(indent, ' ');
-    text += line;
-    text += '\n';
-}
-
-// `fields`, when given, are the fields to show of a top-level structure.
-void AppendValue(std::string& text, const MetaObject* value, size_t indent,
-                 const std::vector<std::string>* fields = nullptr) {
-    if (IsScalar(value)) {
-        AppendLine(text, indent, Scalar(value));
-        return;
-    }
-    if (value->GetType() == MetaObj::META_STRUCT) {
-        const auto& structure = static_cast<const MetaObj::MetaStruct&>(*value);
-        AppendLine(text, indent,
-                   "<structure name=\"" + EscapeAttribute(structure.GetName()) + "\">");
-        std::vector<size_t> shown;
-        if (fields == nullptr) {
-            for (size_t i = 0; i < structure.FieldCount(); ++i) {
-                shown.push_back(i);
-            }
+    // `fields`, when given, are the fields to show of a top-level structure. A listing at the
+    // top is handed to the options' flush as it grows.
+    void Value(const MetaObject* value, size_t indent,
+               const std::vector<std::string>* fields = nullptr, bool top = false) {
+        if (IsScalar(value)) {
+            out_.append(indent, ' ');
+            Scalar(value);
+            out_ += '\n';
+        } else if (value->GetType() == MetaObj::META_STRUCT) {
+            Struct(static_cast<const MetaObj::MetaStruct&>(*value), indent, fields);
         } else {
-            for (const auto& name : *fields) {
-                const size_t index = structure.FindField(name);
-                if (index < structure.FieldCount()) {
-                    shown.push_back(index);
-                }
-            }
+            List(static_cast<const MetaObj::MetaList&>(*value), indent, fields, top);
         }
-        for (size_t index : shown) {
+    }
+
+  private:
+    // A scalar on one line: <integer>42</integer>, or <string/> without a value. A missing
+    // value (a null field) is written as an empty string.
+    void Scalar(const MetaObject* value) {
+        const char* name = value ? ElementName(value->GetType()) : "string";
+        bool hasValue = false;
+        const std::string* text = &scratch_;
+        if (value && value->GetType() == MetaObj::META_STRING) {
+            const auto& scalar = static_cast<const MetaObj::MetaString&>(*value);
+            hasValue = scalar.HasValue();
+            text = &scalar.GetValue();
+        } else {
+            scratch_.clear();
+            AppendValueText(scratch_, value);
+            hasValue = !scratch_.empty();
+        }
+        out_ += '<';
+        out_ += name;
+        if (!hasValue) {
+            out_ += "/>";
+            return;
+        }
+        out_ += '>';
+        AppendEscaped(out_, *text, false);
+        out_ += "</";
+        out_ += name;
+        out_ += '>';
+    }
+
+    void Struct(const MetaObj::MetaStruct& structure, size_t indent,
+                const std::vector<std::string>* fields) {
+        out_.append(indent, ' ');
+        out_ += "<structure name=\"";
+        AppendEscaped(out_, structure.GetName(), true);
+        out_ += "\">\n";
+        const size_t count = fields ? fields->size() : structure.FieldCount();
+        for (size_t i = 0; i < count; ++i) {
+            const size_t index = fields ? structure.FindField((*fields)[i]) : i;
+            if (index >= structure.FieldCount()) {
+                continue;
+            }
             const auto field = structure.FieldAt(index);
-            std::string open = "<field name=\"" + EscapeAttribute(field.name) + "\">";
+            out_.append(indent + kIndentStep, ' ');
+            out_ += "<field name=\"";
+            AppendEscaped(out_, field.name, true);
+            out_ += "\">";
             if (IsScalar(field.value.get())) {
-                AppendLine(text, indent + kIndentStep,
-                           open + Scalar(field.value.get()) + "</field>");
+                Scalar(field.value.get());
             } else {
-                AppendLine(text, indent + kIndentStep, open);
-                AppendValue(text, field.value.get(), indent + 2 * kIndentStep);
-                AppendLine(text, indent + kIndentStep, "</field>");
+                out_ += '\n';
+                Value(field.value.get(), indent + 2 * kIndentStep);
+                out_.append(indent + kIndentStep, ' ');
+            }
+            out_ += "</field>\n";
+        }
+        out_.append(indent, ' ');
+        out_ += "</structure>\n";
+    }
+
+    void List(const MetaObj::MetaList& list, size_t indent, const std::vector<std::string>* fields,
+              bool top) {
+        out_.append(indent, ' ');
+        out_ += "<list type=\"";
+        out_ += ElementName(list.GetElementType());
+        const auto& elements = list.GetElements();
+        if (elements.empty()) {
+            out_ += "\"/>\n";
+            return;
+        }
+        out_ += "\">\n";
+        bool first = true;
+        for (const auto& element : elements) {
+            Value(element.get(), indent + kIndentStep, fields);
+            if (top && first) {
+                // A listing's elements are alike: room made for them, judged by the first.
+                ReserveForListing(out_, elements.size(), options_);
+                first = false;
+            } else if (top) {
+                FlushIfLarge(out_, options_);
             }
         }
-        AppendLine(text, indent, "</structure>");
-        return;
+        out_.append(indent, ' ');
+        out_ += "</list>\n";
     }
-    const auto& list = static_cast<const MetaObj::MetaList&>(*value);
-    std::string open = std::string("<list type=\"") + ElementName(list.GetElementType()) + "\"";
-    if (list.GetElements().empty()) {
-        AppendLine(text, indent, open + "/>");
-        return;
-    }
-    AppendLine(text, indent, open + ">");
-    for (const auto& element : list.GetElements()) {
-        AppendValue(text, element.get(), indent + kIndentStep, fields);
-    }
-    AppendLine(text, indent, "</list>");
-}
+
+    std::string& out_;
+    const FormatOptions& options_;
+    std::string scratch_;  // the text of a scalar that is not a string
+};
 
 }  // namespace
 
 std::string FormatXml(const MetaObject& root, const FormatOptions& options) {
     std::string text = "<?xml version=\"1.0\" encoding=\"UTF-8\"?>\n<output>\n";
-    AppendValue(text, &root, kIndentStep, options.fieldsGiven ? &options.fields : nullptr);
+    XmlWriter(text, options)
+        .Value(&root, kIndentStep, options.fieldsGiven ? &options.fields : nullptr, true);
     text += "</output>\n";
     return text;
 }

@@ -120,8 +120,10 @@ TEST(Formatters, RowsSayWhichHonourFieldsAndNoHeader) {
 TEST(Formatters, ListingHandedOverInPiecesIsTheWholeText) {
     auto disks = MetaList::New(META_STRUCT);
     for (int i = 0; i < 3000; ++i) {
-        disks->Add(Struct("Disk", "Name", MetaString::New("disk-" + std::to_string(i)), "Size",
-                          MetaInt::New(i), "Ssd", MetaBool::New(i % 2 == 0)));
+        // Rows of some 60 bytes even in csv, so that every formatter hands over a few pieces.
+        const std::string name = "disk-" + std::string(40, 'd') + std::to_string(i);
+        disks->Add(Struct("Disk", "Name", MetaString::New(name), "Size", MetaInt::New(i), "Ssd",
+                          MetaBool::New(i % 2 == 0)));
     }
     for (const auto& formatter : Formatters()) {
         FormatOptions options = Options({{"header:Disk", "%Name%"}});
@@ -134,9 +136,7 @@ TEST(Formatters, ListingHandedOverInPiecesIsTheWholeText) {
             ++count;
         };
         EXPECT_EQ(pieces + formatter.function(*disks, options), whole) << formatter.name;
-        // The listings that are written element by element are handed over as they grow.
-        const std::string name = formatter.name;
-        EXPECT_EQ(count > 1, name == "simple" || name == "json" || name == "json-pretty") << name;
+        EXPECT_GT(count, 1u) << formatter.name;
     }
 }
 
@@ -219,14 +219,17 @@ TEST(TableFormatter, PadsByDisplayWidthAndShowsControlsEscaped) {
 }
 
 TEST(XmlFormatter, StableDocumentWithoutForbiddenCharacters) {
-    auto root = Struct("R&D", "Text", MetaString::New("<a & \"b\">\x01\x1f\tend\xEF\xBF\xBF"),
-                       "Empty", MetaString::New(), "Count", MetaInt::New(3), "Texts", Texts({"x"}));
+    // Markup in printable ASCII, and along with what XML cannot carry; a tab in an attribute.
+    auto root = Struct("R&D\t", "Text", MetaString::New("<a & \"b\">\x01\x1f\tend\xEF\xBF\xBF"),
+                       "Plain", MetaString::New("<p & \"q\">"), "Empty", MetaString::New(), "Count",
+                       MetaInt::New(3), "Texts", Texts({"x"}));
     EXPECT_EQ(
         Format("xml", *root),
         "<?xml version=\"1.0\" encoding=\"UTF-8\"?>\n"
         "<output>\n"
-        "  <structure name=\"R&amp;D\">\n"
+        "  <structure name=\"R&amp;D&#9;\">\n"
         "    <field name=\"Text\"><string>&lt;a &amp; &quot;b&quot;&gt;\tend</string></field>\n"
+        "    <field name=\"Plain\"><string>&lt;p &amp; &quot;q&quot;&gt;</string></field>\n"
         "    <field name=\"Empty\"><string/></field>\n"
         "    <field name=\"Count\"><integer>3</integer></field>\n"
         "    <field name=\"Texts\">\n"
