@@ -292,7 +292,8 @@ bool BuildGrid(const MetaObject& root, const OutputLayout& layout, CellStyle sty
             }
             const std::string unit = alike ? selection.units[column]
                                            : layout.Unit(element->GetName(), grid.columns[column]);
-            row.push_back(ScreenText(ValueText(value, unit)));
+            std::string cell = ValueText(value, unit);
+            row.push_back(IsPlainText(cell) ? std::move(cell) : ScreenText(cell));
         }
         grid.rows.push_back(std::move(row));
     }
