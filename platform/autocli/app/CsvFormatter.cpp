@@ -13,9 +13,8 @@ namespace {
 // quotation marks inside. Bytes that are not UTF-8 become U+FFFD, as in the JSON output, so
 // that a reader decoding UTF-8 gets the same text from both.
 void AppendCell(std::string& text, const std::string& raw) {
-    const bool plain = IsPlainText(raw);  // printable ASCII is valid UTF-8 as it stands
-    const std::string clean = plain ? std::string() : ValidUtf8(raw);
-    const std::string& value = plain ? raw : clean;
+    std::string clean;
+    const std::string& value = ValidUtf8(raw, clean);
     if (value.find_first_of(",\"\r\n") == std::string::npos) {
         text += value;
         return;

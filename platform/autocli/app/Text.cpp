@@ -175,13 +175,6 @@ size_t DisplayWidth(const std::string& text) {
     }
     size_t width = 0;
     size_t pos = 0;
-    while (pos < text.size() && text[pos] >= 0x20 && text[pos] < 0x7F) {
-        ++pos;
-        ++width;
-    }
-    if (pos == text.size()) {
-        return width;
-    }
     const locale_t locale = WidthLocale();
     const locale_t previous =
         locale != static_cast<locale_t>(nullptr) ? uselocale(locale) : static_cast<locale_t>(0);
@@ -216,6 +209,14 @@ std::string ValidUtf8(const std::string& text, bool forXml) {
         pos += length;
     }
     return clean;
+}
+
+const std::string& ValidUtf8(const std::string& text, std::string& scratch, bool forXml) {
+    if (IsPlainText(text)) {
+        return text;
+    }
+    scratch = ValidUtf8(text, forXml);
+    return scratch;
 }
 
 std::string MessageText(const std::string& text) {

@@ -31,6 +31,9 @@ size_t DisplayWidth(const std::string& text);
 // leaves out the characters that XML 1.0 forbids (control characters other than tab, line
 // feed and carriage return, and U+FFFE and U+FFFF).
 std::string ValidUtf8(const std::string& text, bool forXml = false);
+// The same without a copy for printable ASCII, which it leaves as it is: returns `text`
+// itself, or the cleaned text, which it keeps in `scratch`.
+const std::string& ValidUtf8(const std::string& text, std::string& scratch, bool forXml = false);
 
 // A text the user typed, made fit to stand in a one-line message: ValidUtf8, and every
 // control character but tab written as an escape ("\n", "\r", "\x1b"), so that a value

@@ -33,9 +33,8 @@ constexpr size_t kIndentStep = 2;
 // a literal tab or line break into a blank, so those are written as character references to
 // read back unchanged.
 void AppendEscaped(std::string& out, const std::string& raw, bool attribute) {
-    const bool plain = IsPlainText(raw);  // printable ASCII: only markup characters change
-    const std::string clean = plain ? std::string() : ValidUtf8(raw, true);
-    const std::string& text = plain ? raw : clean;
+    std::string clean;
+    const std::string& text = ValidUtf8(raw, clean, true);
     size_t start = 0;
     for (size_t i = 0; i < text.size(); ++i) {
         const char* entity = nullptr;
