@@ -8,6 +8,7 @@
 #include <type_traits>
 #include <vector>
 
+#include "UuidText.h"
 #include "hostctl/NetworkAddress.h"
 
 namespace HostCtlSim {
@@ -237,14 +238,8 @@ Disk DiskFromDocument(const Json& document) {
 }
 
 bool IsUuidText(const std::string& text) {
-    if (text.size() != 36) return false;
-    for (size_t i = 0; i < text.size(); ++i) {
-        bool dash = i == 8 || i == 13 || i == 18 || i == 23;
-        if (dash ? text[i] != '-' : !std::isxdigit(static_cast<unsigned char>(text[i]))) {
-            return false;
-        }
-    }
-    return true;
+    HostCtl::Mesk::Uuid uuid;
+    return ParseUuid(text.data(), text.size(), uuid);
 }
 
 std::string LowerCase(std::string text) {
